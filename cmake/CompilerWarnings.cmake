@@ -1,0 +1,19 @@
+# One interface target carries the warnings; every target of ours links it privately.
+add_library(zo_warnings INTERFACE)
+target_compile_options(zo_warnings INTERFACE
+  -Wall -Wextra -Wpedantic
+  -Wshadow              # a shadowed member or argument hides a real mistake too often
+  -Wnon-virtual-dtor    # every interface is deleted through its base somewhere
+  -Wextra-semi
+  -Wcast-qual           # payloads are shared as const memory
+  -Wformat=2)
+if(ZO_WARNINGS_AS_ERRORS)
+  target_compile_options(zo_warnings INTERFACE -Werror)
+endif()
+if(ZO_SANITIZE AND CMAKE_CXX_COMPILER_ID STREQUAL "GNU")
+  # The sanitizers' instrumentation makes gcc report these on code that is sound.
+  target_compile_options(zo_warnings INTERFACE -Wno-maybe-uninitialized -Wno-tsan)
+endif()
+if(CMAKE_CXX_COMPILER_ID MATCHES "Clang" AND ZO_THREAD_SAFETY_ANALYSIS)
+  target_compile_options(zo_warnings INTERFACE -Wthread-safety -Werror=thread-safety)
+endif()

@@ -1,0 +1,1 @@
+# The install tree is added here as its parts come to stand.
