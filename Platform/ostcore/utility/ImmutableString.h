@@ -89,6 +89,8 @@ ZOPLATFORM_EXPORT std::ostream& operator<<(std::ostream& ioStream, const Immutab
 namespace std {
 template <>
 struct hash<ostcore::utility::ImmutableString> {
-    size_t operator()(const ostcore::utility::ImmutableString& inString) const noexcept { return inString.Hash(); }
+    size_t operator()(const ostcore::utility::ImmutableString& inString) const noexcept {
+        return inString.Hash();
+    }
 };
 }  // namespace std
