@@ -43,7 +43,7 @@ macro(zo_add_client_library)
       LINKER_LANGUAGE CXX VERSION ${PROJECT_VERSION} SOVERSION ${PROJECT_VERSION_MAJOR})
     target_include_directories(ZOClient PUBLIC
       $<BUILD_INTERFACE:${PROJECT_SOURCE_DIR}/API/Inc>
-      $<INSTALL_INTERFACE:${CMAKE_INSTALL_INCLUDEDIR}>)
+      $<INSTALL_INTERFACE:${CMAKE_INSTALL_INCLUDEDIR}/zoclient>)
     target_link_libraries(ZOClient PUBLIC ZOClientPlatform)
 
     add_library(zoclient_internal STATIC ${zo_floor_objects})

@@ -1,1 +1,39 @@
-# The install tree is added here as its parts come to stand.
+# The install tree: libraries, headers, the CMake package, pkg-config files, the programs and their manuals.
+include(CMakePackageConfigHelpers)
+
+set(zo_include_dir ${CMAKE_INSTALL_INCLUDEDIR}/zoclient)
+set(zo_package_dir ${CMAKE_INSTALL_LIBDIR}/cmake/ZOClient)
+
+set(zo_libraries ZOClient ZOClientPlatform)
+if(TARGET ZOClientTesting)
+  list(APPEND zo_libraries ZOClientTesting)
+endif()
+# Next to one another, so that an installation can be moved as a whole.
+set_target_properties(${zo_libraries} PROPERTIES INSTALL_RPATH "$ORIGIN")
+install(TARGETS ${zo_libraries} EXPORT ZOClientTargets
+  LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR}
+  ARCHIVE DESTINATION ${CMAKE_INSTALL_LIBDIR}
+  INCLUDES DESTINATION ${zo_include_dir})
+install(EXPORT ZOClientTargets NAMESPACE ZOClient:: DESTINATION ${zo_package_dir})
+
+install(DIRECTORY ${PROJECT_SOURCE_DIR}/API/Inc/ DESTINATION ${zo_include_dir} FILES_MATCHING PATTERN "*.h")
+install(DIRECTORY ${PROJECT_SOURCE_DIR}/Platform/ DESTINATION ${zo_include_dir}
+  FILES_MATCHING PATTERN "*.h" PATTERN "detail" EXCLUDE)
+
+configure_package_config_file(${PROJECT_SOURCE_DIR}/cmake/ZOClientConfig.cmake.in
+  ${PROJECT_BINARY_DIR}/ZOClientConfig.cmake INSTALL_DESTINATION ${zo_package_dir})
+write_basic_package_version_file(${PROJECT_BINARY_DIR}/ZOClientConfigVersion.cmake COMPATIBILITY SameMinorVersion)
+install(FILES ${PROJECT_BINARY_DIR}/ZOClientConfig.cmake ${PROJECT_BINARY_DIR}/ZOClientConfigVersion.cmake
+  DESTINATION ${zo_package_dir})
+
+foreach(name zoclient zoclient-testing)
+  configure_file(${PROJECT_SOURCE_DIR}/Packaging/${name}.pc.in ${PROJECT_BINARY_DIR}/${name}.pc @ONLY)
+  install(FILES ${PROJECT_BINARY_DIR}/${name}.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig)
+endforeach()
+
+foreach(program zo zohub)
+  if(TARGET ${program})
+    set_target_properties(${program} PROPERTIES INSTALL_RPATH "$ORIGIN/../${CMAKE_INSTALL_LIBDIR}")
+    install(TARGETS ${program} RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR})
+  endif()
+endforeach()

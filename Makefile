@@ -1,0 +1,49 @@
+# The front door: `make demo` shows the whole on this machine, `make test` tests it.
+# Everything else is a CMake preset; see CMakePresets.json.
+JOBS ?= $(shell nproc)
+BENCH := $(NAME)
+
+.PHONY: demo test bench packages build release asan tsan analysis format format-check tidy clean
+
+packages:
+	@Packaging/install-packages.sh
+
+build: packages
+	cmake --preset dev >/dev/null
+	cmake --build --preset dev -j $(JOBS)
+
+demo: build
+	bash Tools/demo/demo.sh build/dev
+
+test: build
+	ctest --preset dev -j $(JOBS)
+
+release: packages
+	cmake --preset release >/dev/null
+	cmake --build --preset release -j $(JOBS)
+
+# All benchmarks, or one: make bench NAME=requests
+bench: release
+	@python3 Benchmarks/run.py build/release $(BENCH)
+
+asan tsan: packages
+	cmake --preset $@ >/dev/null
+	cmake --build --preset $@ -j $(JOBS)
+	ctest --preset $@ -j $(JOBS) -LE build
+
+# clang checks the lock annotations; nothing is run.
+analysis: packages
+	cmake --preset analysis >/dev/null
+	cmake --build --preset analysis -j $(JOBS)
+
+SOURCES = $(shell git ls-files '*.h' '*.cpp')
+format:
+	clang-format -i $(SOURCES)
+format-check:
+	clang-format --dry-run -Werror $(SOURCES)
+
+tidy: build
+	python3 Tools/dev/tidy.py build/dev
+
+clean:
+	rm -rf build
