@@ -66,8 +66,8 @@ public:
 
     /// The same for a message given by value.
     template <class T>
-    static auto PostMessageToUIThread(const ImmutableString& inStation, const T& inMessage, bool inSynchronous)
-        -> decltype(T::TypeID(), true) {
+    static auto PostMessageToUIThread(const ImmutableString& inStation, const T& inMessage,
+                                      bool inSynchronous) -> decltype(T::TypeID(), true) {
         return PostMessageToUIThread(inStation, shared_ptr<Message const>(boost::make_shared<T>(inMessage)),
                                      inSynchronous);
     }

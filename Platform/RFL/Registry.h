@@ -88,7 +88,8 @@ public:
     static int Open(RegistryRoot inRoot, const UString& inPath, RegistryAccess inAccess, RegistryKey& outKey);
     /// Opens a key for reading and writing, making it and its parents when they are missing. outCreated, when
     /// given, tells whether the key was made by this call.
-    static int Create(RegistryRoot inRoot, const UString& inPath, RegistryKey& outKey, bool* outCreated = nullptr);
+    static int Create(RegistryRoot inRoot, const UString& inPath, RegistryKey& outKey,
+                      bool* outCreated = nullptr);
 
     bool IsValid() const noexcept { return !mPath.empty(); }
     /// A key below this one.

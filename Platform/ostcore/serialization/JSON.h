@@ -214,7 +214,17 @@ public:
 private:
     friend class JSONView;
     friend class JSONTreeAccess;
-    enum class Kind : std::uint8_t { Null, Boolean, Integer, Unsigned, Double, String, Array, Object, Parsed };
+    enum class Kind : std::uint8_t {
+        Null,
+        Boolean,
+        Integer,
+        Unsigned,
+        Double,
+        String,
+        Array,
+        Object,
+        Parsed
+    };
 
     struct StringNode;
     struct ArrayNode;

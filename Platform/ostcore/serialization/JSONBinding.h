@@ -68,7 +68,8 @@ class BindingTable;
 /// One key of a table. The nested table is named by function, so that tables may refer to each other and to
 /// themselves.
 struct BindingField {
-    BindingField(std::string_view inKey, BindingKind inKind, const BindingTable& (*inNested)() = nullptr) noexcept
+    BindingField(std::string_view inKey, BindingKind inKind,
+                 const BindingTable& (*inNested)() = nullptr) noexcept
         : key(inKey), kind(inKind), nested(inNested) {}
     /// A literal; at most 255 bytes.
     std::string_view key;
@@ -93,7 +94,9 @@ private:
     static std::size_t Slot(std::string_view inKey) noexcept {
         // Length, first, last and middle byte tell the keys of one structure apart nearly always.
         const std::size_t size = inKey.size();
-        const auto byte = [&](std::size_t inAt) { return static_cast<std::size_t>(static_cast<unsigned char>(inKey[inAt])); };
+        const auto byte = [&](std::size_t inAt) {
+            return static_cast<std::size_t>(static_cast<unsigned char>(inKey[inAt]));
+        };
         return size == 0 ? 0 : (size + byte(0) * 7 + byte(size - 1) * 31 + byte(size / 2) * 13) % kSlots;
     }
     const BindingField* FindField(std::string_view inKey, std::size_t& ioHint) const noexcept;
@@ -119,7 +122,9 @@ class BoundList;
 class BoundObject {
 public:
     BoundObject() = default;
-    BoundObject(const JSONValue& inBody, const BindingTable& inTable) : mBody(inBody) { inTable.Check(mBody); }
+    BoundObject(const JSONValue& inBody, const BindingTable& inTable) : mBody(inBody) {
+        inTable.Check(mBody);
+    }
     BoundObject(const JSONValue& inBody, AlreadyChecked) noexcept : mBody(inBody) {}
 
     /// The object as it was read, unknown keys included.
@@ -227,7 +232,9 @@ public:
         friend bool operator!=(const Iterator& inLeft, const Iterator& inRight) {
             return inLeft.mPosition != inRight.mPosition;
         }
-        friend bool operator==(const Iterator& inLeft, const Iterator& inRight) { return !(inLeft != inRight); }
+        friend bool operator==(const Iterator& inLeft, const Iterator& inRight) {
+            return !(inLeft != inRight);
+        }
 
     private:
         const BoundList* mList;

@@ -23,10 +23,12 @@ ZOPLATFORM_EXPORT ImmutableString ReadMandatoryString(JSONView inObject, std::st
 
 /// The optional readers leave the target as it was when the key is absent, and when they throw.
 /// They return true when the target was set.
-ZOPLATFORM_EXPORT bool ReadOptionalString(JSONView inObject, std::string_view inKey, ImmutableString& ioTarget);
+ZOPLATFORM_EXPORT bool ReadOptionalString(JSONView inObject, std::string_view inKey,
+                                          ImmutableString& ioTarget);
 ZOPLATFORM_EXPORT bool ReadOptionalString(JSONView inObject, std::string_view inKey, std::string& ioTarget);
 ZOPLATFORM_EXPORT bool ReadOptionalBoolean(JSONView inObject, std::string_view inKey, bool& ioTarget);
-ZOPLATFORM_EXPORT bool ReadOptionalBoolean(JSONView inObject, std::string_view inKey, optional<bool>& ioTarget);
+ZOPLATFORM_EXPORT bool ReadOptionalBoolean(JSONView inObject, std::string_view inKey,
+                                           optional<bool>& ioTarget);
 ZOPLATFORM_EXPORT bool ReadOptionalInt64(JSONView inObject, std::string_view inKey, std::int64_t& ioTarget);
 ZOPLATFORM_EXPORT bool ReadOptionalInt32(JSONView inObject, std::string_view inKey, std::int32_t& ioTarget);
 ZOPLATFORM_EXPORT bool ReadOptionalUInt32(JSONView inObject, std::string_view inKey, std::uint32_t& ioTarget);
@@ -38,7 +40,8 @@ ZOPLATFORM_EXPORT bool ReadOptionalStringList(JSONView inObject, std::string_vie
 
 /// The ticks of a tick time, the object {"ticks": integer} with an integer of 32 or 64 bits. inDefault when
 /// the key is absent; 0 when the object has no "ticks".
-ZOPLATFORM_EXPORT std::int64_t ReadTicks(JSONView inObject, std::string_view inKey, std::int64_t inDefault = 0);
+ZOPLATFORM_EXPORT std::int64_t ReadTicks(JSONView inObject, std::string_view inKey,
+                                         std::int64_t inDefault = 0);
 
 /// The object under a key; the absent view, which has no keys, when there is none.
 ZOPLATFORM_EXPORT JSONView ReadObject(JSONView inObject, std::string_view inKey);
