@@ -102,7 +102,10 @@ JSONValue JSONValue::Own(JSONView inPart) const {
     if (!inPart.mDocument) {
         return *inPart.mValue;
     }
-    return AtTapeIndex(inPart.mIndex);
+    // The part of a tree can lie in a document of its own.
+    JSONValue result = JSONTreeAccess::Make(Kind::Parsed, intrusive_ptr<const JSONShared>(inPart.mDocument));
+    result.mBits = inPart.mIndex;
+    return result;
 }
 
 JSONValue JSONValue::AtTapeIndex(std::size_t inIndex) const noexcept {

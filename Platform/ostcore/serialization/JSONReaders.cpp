@@ -248,11 +248,13 @@ ptime ParseDate(std::string_view inText) {
         ThrowMalformedDate();
     }
     try {
-        return ptime(boost::gregorian::date(static_cast<unsigned short>(year),
-                                            static_cast<unsigned short>(month),
-                                            static_cast<unsigned short>(day)),
-                     time) +
-               zone;
+        const boost::gregorian::date date(static_cast<unsigned short>(year),
+                                          static_cast<unsigned short>(month),
+                                          static_cast<unsigned short>(day));
+        const ptime result = ptime(date, time) + zone;
+        // The zone can carry a time out of the years that dates have; nobody could read it then.
+        result.date().year_month_day();
+        return result;
     } catch (const std::out_of_range&) {
         ThrowMalformedDate();
     }

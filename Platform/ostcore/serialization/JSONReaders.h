@@ -50,8 +50,8 @@ ZOPLATFORM_EXPORT JSONView ReadList(JSONView inObject, std::string_view inKey);
 
 /// Reads "YYYY-MM-DDThh:mm:ss" with an optional fraction of a second (microseconds are kept, further digits
 /// dropped) and a zone behind it: "Z" or nothing for UTC, else "+hh:mm" or "-hh:mm". The result is in UTC:
-/// 10:00:00-05:00 is 15:00. Empty text is not-a-date-time. Throws std::runtime_error for anything else; the
-/// error text does not quote the input.
+/// 10:00:00-05:00 is 15:00. Years 1400 to 9999. Empty text is not-a-date-time. Throws std::runtime_error for
+/// anything else; the error text does not quote the input.
 ZOPLATFORM_EXPORT ptime ParseDate(std::string_view inText);
 
 }  // namespace serialization
