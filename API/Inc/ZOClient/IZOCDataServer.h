@@ -30,6 +30,9 @@ class ZOCL_EXPORT IZOCDataServer : public RFL::RFLUnknown {
 public:
     static constexpr RFL::InterfaceID kInterfaceID{0x7a6f634461746153ull, 0x6572766572000001ull};
 
+    /// Posted at the end of every connect request (Messages.h).
+    struct LoginCompleteMessage;
+
     using ConnectCompletion =
         function<void(const Guid& inRequestID, const InterfaceRef<IZOCDataServer>& inServer, int inResult,
                       const shared_ptr<ostnet::Response>& inResponse)>;
@@ -47,12 +50,14 @@ public:
                                                 bool inKeepCredentials, bool inBecomeLoggedIn);
     /// Builds the object and its chain and starts nothing.
     static InterfaceRef<IZOCDataServer> CreateDataServerRef(const ImmutableString& inServer,
-                                                            const ZOSCredentials& inCredentials, bool inSecure,
-                                                            bool inKeepCredentials, bool inBecomeLoggedIn);
+                                                            const ZOSCredentials& inCredentials,
+                                                            bool inSecure, bool inKeepCredentials,
+                                                            bool inBecomeLoggedIn);
     /// For services that work without login: loads the documents and stops there.
     static bool CreateUnauthenticatedDataServer(
         const Guid& inRequestID, const ImmutableString& inServer,
-        const function<void(int inResult, InterfaceRef<IZOCDataServer> inServer)>& inCompletion, bool inSecure);
+        const function<void(int inResult, InterfaceRef<IZOCDataServer> inServer)>& inCompletion,
+        bool inSecure);
     /// Adds the scheme and the default port where they are missing.
     static ImmutableString MakeDataServerURL(const ImmutableString& inServer, bool inSecure);
     static ImmutableString GetDiscoveryURL(const ImmutableString& inServer);
@@ -79,16 +84,19 @@ public:
     virtual InterfaceRef<IZOCUser> GetLoggedInUser() = 0;
     /// The discovery URL without its fixed path.
     virtual ImmutableString GetServerBaseURL() = 0;
-    virtual bool CreateProduction(const Guid& inRequestID, const UString& inName, const UString& inDescription,
-                                  bool inIsTemporary, const RequestCompletion& inCompletion) = 0;
+    virtual bool CreateProduction(const Guid& inRequestID, const UString& inName,
+                                  const UString& inDescription, bool inIsTemporary,
+                                  const RequestCompletion& inCompletion) = 0;
     /// Blocks; null on failure.
     virtual InterfaceRef<IZOCProduction> CreateProduction(const UString& inName, const UString& inDescription,
                                                           bool inIsTemporary) = 0;
     virtual InterfaceRef<IZOCMediaLocator> GetMediaLocator(const ImmutableString& inID) = 0;
     virtual InterfaceRef<IZOCServerResource> GetMediaLocators() = 0;
     virtual bool CreateAsset(const Guid& inRequestID, const ImmutableString& inFactoryURL,
-                             const AssetBaseProperties& inProperties, const RequestCompletion& inCompletion) = 0;
-    virtual InterfaceRef<IZOCAsset> GetAssetFromURL(const ImmutableString& inURL, ResourceWritability inWritability) = 0;
+                             const AssetBaseProperties& inProperties,
+                             const RequestCompletion& inCompletion) = 0;
+    virtual InterfaceRef<IZOCAsset> GetAssetFromURL(const ImmutableString& inURL,
+                                                    ResourceWritability inWritability) = 0;
     /// From the cache, or created; loaded, which blocks. A production that cannot be loaded is returned
     /// unloaded.
     virtual InterfaceRef<IZOCProduction> GetProductionFromURL(const ImmutableString& inURL) = 0;
@@ -98,7 +106,8 @@ public:
     /// Unloaded; null without the link.
     virtual InterfaceRef<IZOCProduction> GetProductionByIdAndCommitId(const ImmutableString& inProductionID,
                                                                       const ImmutableString& inCommitID) = 0;
-    virtual InterfaceRef<IZOCProduction> GetProductionByIdAndCommitId(const ProductionRevision& inRevision) = 0;
+    virtual InterfaceRef<IZOCProduction> GetProductionByIdAndCommitId(
+        const ProductionRevision& inRevision) = 0;
     /// Blocks; null when there was no 2xx answer.
     virtual shared_ptr<RecycledMemory const> GetPayloadFromURL(const ImmutableString& inURL) = 0;
     virtual bool PostToURL(const ImmutableString& inURL, const shared_ptr<RecycledMemory const>& inBody,
@@ -107,8 +116,8 @@ public:
     virtual bool PostToURL(const ImmutableString& inURL, const shared_ptr<RecycledMemory const>& inBody,
                            const ostnet::Headers& inHeaders, const Guid& inRequestID,
                            const RequestCompletion& inCompletion) = 0;
-    virtual bool PostToURL(const ImmutableString& inURL, const ostnet::http::Form& inForm, const Guid& inRequestID,
-                           const RequestCompletion& inCompletion) = 0;
+    virtual bool PostToURL(const ImmutableString& inURL, const ostnet::http::Form& inForm,
+                           const Guid& inRequestID, const RequestCompletion& inCompletion) = 0;
 
     // --- The verbs. As RequestProcessor: a true result means exactly one completion, on a worker.
 
@@ -127,12 +136,14 @@ public:
                       const ImmutableString& inURL, ostnet::Headers inHeaders,
                       const shared_ptr<RecycledMemory const>& inPayload) = 0;
     virtual bool POST(const Guid& inRequestID, const ostnet::http::CompletionFunction& inCompletion,
-                      const ImmutableString& inURL, ostnet::Headers inHeaders, const ostnet::http::Form& inForm) = 0;
+                      const ImmutableString& inURL, ostnet::Headers inHeaders,
+                      const ostnet::http::Form& inForm) = 0;
     virtual bool PUT(const Guid& inRequestID, const ostnet::http::CompletionFunction& inCompletion,
                      const ImmutableString& inURL, ostnet::Headers inHeaders,
                      const shared_ptr<RecycledMemory const>& inPayload) = 0;
     virtual bool PUT(const Guid& inRequestID, const ostnet::http::CompletionFunction& inCompletion,
-                     const ImmutableString& inURL, ostnet::Headers inHeaders, const ostnet::http::Form& inForm) = 0;
+                     const ImmutableString& inURL, ostnet::Headers inHeaders,
+                     const ostnet::http::Form& inForm) = 0;
 
     // --- Blocking verbs; null when the request could not be started. Never from a completion.
 
@@ -155,7 +166,8 @@ public:
     virtual shared_ptr<ostnet::Response> BlockingPOST(const ImmutableString& inURL, ostnet::Headers inHeaders,
                                                       const ostnet::http::Form& inForm,
                                                       std::uint32_t inTimeoutMilliseconds) = 0;
-    virtual shared_ptr<ostnet::Response> BlockingDELETE(const ImmutableString& inURL, ostnet::Headers inHeaders,
+    virtual shared_ptr<ostnet::Response> BlockingDELETE(const ImmutableString& inURL,
+                                                        ostnet::Headers inHeaders,
                                                         std::uint32_t inTimeoutMilliseconds) = 0;
 
     /// Moves a URL onto the scheme, host and port that the client connected to.

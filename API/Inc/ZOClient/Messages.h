@@ -1,0 +1,34 @@
+// The messages that the library posts on its station (GetStationID). All are delivered on the main thread.
+#pragma once
+
+#include "RFL/Messaging.h"
+#include "ZOClient/IZOCDataServer.h"
+#include "ZOClient/ServerFeatureReport.h"
+
+namespace ZOCL {
+
+/// A login was accepted and its data server has become the logged-in one.
+struct ZOCL_EXPORT ZOLoginMessage : RFL::MessageImpl<ZOLoginMessage> {};
+
+/// IZOCDataServer::Terminate has ended the session.
+struct ZOCL_EXPORT ZOLogoutMessage : RFL::MessageImpl<ZOLogoutMessage> {};
+
+/// A connect request has ended; posted before its completion is called.
+struct ZOCL_EXPORT IZOCDataServer::LoginCompleteMessage
+    : RFL::MessageImpl<IZOCDataServer::LoginCompleteMessage> {
+    Guid requestID;
+    /// Null on failure.
+    InterfaceRef<IZOCDataServer> server;
+    int result = 0;
+    /// The last response of the sequence; null when there was none.
+    shared_ptr<ostnet::Response> response;
+};
+
+/// A new report on a server has been read.
+struct ZOCL_EXPORT ServerFeatureReportUpdatedMessage : RFL::MessageImpl<ServerFeatureReportUpdatedMessage> {
+    /// The server's base URL without its scheme.
+    ImmutableString url;
+    shared_ptr<ServerFeatureReport const> report;
+};
+
+}  // namespace ZOCL
