@@ -20,7 +20,8 @@ using ostcore::utility::RecycledMemory;
 /// Compares header names without regard to the case of ASCII letters (RFC 9110, section 5.1).
 struct HeaderNameLess {
     using is_transparent = void;
-    ZOPLATFORM_EXPORT bool operator()(const ImmutableString& inLeft, const ImmutableString& inRight) const noexcept;
+    ZOPLATFORM_EXPORT bool operator()(const ImmutableString& inLeft,
+                                      const ImmutableString& inRight) const noexcept;
 };
 /// Header fields by name; a name can occur more than once. Passed by value between layers.
 using Headers = std::multimap<ImmutableString, ImmutableString, HeaderNameLess>;

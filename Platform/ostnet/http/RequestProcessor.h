@@ -50,22 +50,24 @@ public:
     /// Best effort: a request that is held here ends with status -1; otherwise the next layer is asked.
     /// An unknown ID has no effect.
     virtual void TryToCancelRequest(const Guid& inRequestID) = 0;
-    virtual bool GET(const Guid& inRequestID, const CompletionFunction& inCompletion, const ImmutableString& inURL,
-                     Headers inHeaders, const RequestOptions& inOptions) = 0;
-    virtual bool HEAD(const Guid& inRequestID, const CompletionFunction& inCompletion, const ImmutableString& inURL,
-                      Headers inHeaders, const RequestOptions& inOptions) = 0;
-    virtual bool PUT(const Guid& inRequestID, const CompletionFunction& inCompletion, const ImmutableString& inURL,
-                     Headers inHeaders, const shared_ptr<RecycledMemory const>& inPayload,
+    virtual bool GET(const Guid& inRequestID, const CompletionFunction& inCompletion,
+                     const ImmutableString& inURL, Headers inHeaders, const RequestOptions& inOptions) = 0;
+    virtual bool HEAD(const Guid& inRequestID, const CompletionFunction& inCompletion,
+                      const ImmutableString& inURL, Headers inHeaders, const RequestOptions& inOptions) = 0;
+    virtual bool PUT(const Guid& inRequestID, const CompletionFunction& inCompletion,
+                     const ImmutableString& inURL, Headers inHeaders,
+                     const shared_ptr<RecycledMemory const>& inPayload, const RequestOptions& inOptions) = 0;
+    virtual bool PUT(const Guid& inRequestID, const CompletionFunction& inCompletion,
+                     const ImmutableString& inURL, Headers inHeaders, const Form& inForm,
                      const RequestOptions& inOptions) = 0;
-    virtual bool PUT(const Guid& inRequestID, const CompletionFunction& inCompletion, const ImmutableString& inURL,
-                     Headers inHeaders, const Form& inForm, const RequestOptions& inOptions) = 0;
-    virtual bool POST(const Guid& inRequestID, const CompletionFunction& inCompletion, const ImmutableString& inURL,
-                      Headers inHeaders, const shared_ptr<RecycledMemory const>& inPayload,
+    virtual bool POST(const Guid& inRequestID, const CompletionFunction& inCompletion,
+                      const ImmutableString& inURL, Headers inHeaders,
+                      const shared_ptr<RecycledMemory const>& inPayload, const RequestOptions& inOptions) = 0;
+    virtual bool POST(const Guid& inRequestID, const CompletionFunction& inCompletion,
+                      const ImmutableString& inURL, Headers inHeaders, const Form& inForm,
                       const RequestOptions& inOptions) = 0;
-    virtual bool POST(const Guid& inRequestID, const CompletionFunction& inCompletion, const ImmutableString& inURL,
-                      Headers inHeaders, const Form& inForm, const RequestOptions& inOptions) = 0;
-    virtual bool DELETE(const Guid& inRequestID, const CompletionFunction& inCompletion, const ImmutableString& inURL,
-                        Headers inHeaders, const RequestOptions& inOptions) = 0;
+    virtual bool DELETE(const Guid& inRequestID, const CompletionFunction& inCompletion,
+                        const ImmutableString& inURL, Headers inHeaders, const RequestOptions& inOptions) = 0;
     virtual ~RequestProcessor();
 
     /// Runs a function on a worker after the delay; 0 means as soon as possible. False: it will not run.
@@ -92,8 +94,10 @@ public:
     explicit ForwardingProcessor(shared_ptr<RequestProcessor> inNext);
 
     void TryToCancelRequest(const Guid& inRequestID) override;
-    bool GET(const Guid&, const CompletionFunction&, const ImmutableString&, Headers, const RequestOptions&) override;
-    bool HEAD(const Guid&, const CompletionFunction&, const ImmutableString&, Headers, const RequestOptions&) override;
+    bool GET(const Guid&, const CompletionFunction&, const ImmutableString&, Headers,
+             const RequestOptions&) override;
+    bool HEAD(const Guid&, const CompletionFunction&, const ImmutableString&, Headers,
+              const RequestOptions&) override;
     bool PUT(const Guid&, const CompletionFunction&, const ImmutableString&, Headers,
              const shared_ptr<RecycledMemory const>&, const RequestOptions&) override;
     bool PUT(const Guid&, const CompletionFunction&, const ImmutableString&, Headers, const Form&,
@@ -120,11 +124,13 @@ ZOPLATFORM_EXPORT shared_ptr<RequestProcessor> GetGlobalRequestProcessor();
 
 /// Puts another processor in the place of the global one and returns the former; a null pointer restores
 /// the network. For test hosts, before anything connects.
-ZOPLATFORM_EXPORT shared_ptr<RequestProcessor> SetGlobalRequestProcessor(shared_ptr<RequestProcessor> inProcessor);
+ZOPLATFORM_EXPORT shared_ptr<RequestProcessor> SetGlobalRequestProcessor(
+    shared_ptr<RequestProcessor> inProcessor);
 
 /// Turns a form into a multipart/form-data payload (RFC 7578), one part a field in order, and sets the
 /// Content-Type in ioHeaders. A field name with CR, LF, NUL or a double quote is refused: null is returned.
-ZOPLATFORM_EXPORT shared_ptr<RecycledMemory const> ConvertFormToPayload(const Form& inForm, Headers& ioHeaders);
+ZOPLATFORM_EXPORT shared_ptr<RecycledMemory const> ConvertFormToPayload(const Form& inForm,
+                                                                        Headers& ioHeaders);
 
 /// Builds a multi-part body part by part: AppendFormPart for each, then CompleteForm once.
 class ZOPLATFORM_EXPORT FormBuilder {

@@ -1,0 +1,396 @@
+#include "ostnet/http/NetworkThread.h"
+
+#include <sys/epoll.h>
+#include <sys/eventfd.h>
+#include <unistd.h>
+
+#include <array>
+
+#include "ostcore/debug/Trace.h"
+#include "ostnet/http/ThreadStart.h"
+
+namespace ostnet {
+namespace http {
+namespace {
+
+using ostcore::threads::MutexLock;
+
+constexpr std::size_t kMostIdleHandles = 64;
+constexpr std::size_t kEventsAtOnce = 128;
+constexpr long kReceiveBufferSize = 64 << 10;
+constexpr std::chrono::milliseconds kSlowestSweep(1000);
+constexpr std::chrono::milliseconds kFastestSweep(20);
+
+std::uint32_t EventsOf(int inWhat) noexcept {
+    return ((inWhat & CURL_POLL_IN) != 0 ? EPOLLIN : 0u) | ((inWhat & CURL_POLL_OUT) != 0 ? EPOLLOUT : 0u);
+}
+
+int ActionsOf(std::uint32_t inEvents) noexcept {
+    return ((inEvents & EPOLLIN) != 0 ? CURL_CSELECT_IN : 0) |
+           ((inEvents & EPOLLOUT) != 0 ? CURL_CSELECT_OUT : 0) |
+           ((inEvents & (EPOLLERR | EPOLLHUP)) != 0 ? CURL_CSELECT_ERR : 0);
+}
+
+const char* OrNone(const std::string& inText) noexcept {
+    return inText.empty() ? nullptr : inText.c_str();
+}
+
+void PrepareTrust(CURL* ioHandle, const NetworkSettings& inSettings) {
+    curl_easy_setopt(ioHandle, CURLOPT_SSL_VERIFYPEER, 1L);
+    curl_easy_setopt(ioHandle, CURLOPT_SSL_VERIFYHOST, 2L);
+    curl_easy_setopt(ioHandle, CURLOPT_SSLVERSION, static_cast<long>(CURL_SSLVERSION_TLSv1_2));
+    const auto& file = inSettings.certificateAuthorityFile;
+    const auto& directory = inSettings.certificateAuthorityDirectory;
+    if (!file.empty() || !directory.empty()) {
+        // Both are set, so that the system's authorities are not trusted beside the chosen ones.
+        for (const CURLoption option : {CURLOPT_CAINFO, CURLOPT_PROXY_CAINFO}) {
+            curl_easy_setopt(ioHandle, option, OrNone(file));
+        }
+        for (const CURLoption option : {CURLOPT_CAPATH, CURLOPT_PROXY_CAPATH}) {
+            curl_easy_setopt(ioHandle, option, OrNone(directory));
+        }
+    }
+}
+
+/// Sets all options that do not change from request to request.
+void Prepare(CURL* ioHandle, const NetworkSettings& inSettings) {
+    curl_easy_setopt(ioHandle, CURLOPT_NOSIGNAL, 1L);
+    // A cancel must not wait for a name look-up that is under way.
+    curl_easy_setopt(ioHandle, CURLOPT_QUICK_EXIT, 1L);
+    curl_easy_setopt(ioHandle, CURLOPT_PROTOCOLS_STR, "http,https");
+    curl_easy_setopt(ioHandle, CURLOPT_FOLLOWLOCATION, 0L);
+    curl_easy_setopt(ioHandle, CURLOPT_PATH_AS_IS, 1L);
+    curl_easy_setopt(ioHandle, CURLOPT_HTTP09_ALLOWED, 0L);
+    curl_easy_setopt(ioHandle, CURLOPT_SUPPRESS_CONNECT_HEADERS, 1L);
+    curl_easy_setopt(ioHandle, CURLOPT_TCP_KEEPALIVE, 1L);
+    curl_easy_setopt(ioHandle, CURLOPT_BUFFERSIZE, kReceiveBufferSize);
+    curl_easy_setopt(ioHandle, CURLOPT_USERAGENT, OrNone(inSettings.userAgent));
+    curl_easy_setopt(ioHandle, CURLOPT_CONNECTTIMEOUT_MS,
+                     static_cast<long>(inSettings.limits.connectTimeout));
+    if (!inSettings.proxy.empty()) {
+        curl_easy_setopt(ioHandle, CURLOPT_PROXY, inSettings.proxy.c_str());
+        curl_easy_setopt(ioHandle, CURLOPT_NOPROXY, inSettings.noProxy.c_str());
+    }
+    PrepareTrust(ioHandle, inSettings);
+}
+
+}  // namespace
+
+NetworkThread::NetworkThread(Ended inEnded, Progressed inProgressed, std::uint32_t inMaximumConnections)
+    : mEnded(std::move(inEnded)), mProgressed(std::move(inProgressed)), mSweepEvery(kSlowestSweep) {
+    if (OpenEngine(inMaximumConnections)) {
+        mThread = StartThread([this] { Run(); });
+        return;
+    }
+    ostcore::debug::Trace(
+        "ostnet", ostcore::debug::kTraceLevel_Fatal,
+        "The network cannot start: no descriptor for its event queue. Raise the limit of open files.");
+    MutexLock lock(mMutex);
+    mIsStopped = true;
+}
+
+NetworkThread::~NetworkThread() {
+    Stop();
+    CloseAll();
+}
+
+bool NetworkThread::OpenEngine(std::uint32_t inMaximumConnections) {
+    static const CURLcode sGlobalInit = curl_global_init(CURL_GLOBAL_DEFAULT);
+    mEpoll = epoll_create1(EPOLL_CLOEXEC);
+    mWakeUp = eventfd(0, EFD_CLOEXEC | EFD_NONBLOCK);
+    mMulti = curl_multi_init();
+    if (sGlobalInit != CURLE_OK || mEpoll < 0 || mWakeUp < 0 || !mMulti) {
+        return false;
+    }
+    curl_multi_setopt(mMulti, CURLMOPT_SOCKETFUNCTION, &NetworkThread::OnSocketChange);
+    curl_multi_setopt(mMulti, CURLMOPT_SOCKETDATA, this);
+    curl_multi_setopt(mMulti, CURLMOPT_TIMERFUNCTION, &NetworkThread::OnTimerChange);
+    curl_multi_setopt(mMulti, CURLMOPT_TIMERDATA, this);
+    curl_multi_setopt(mMulti, CURLMOPT_PIPELINING, static_cast<long>(CURLPIPE_MULTIPLEX));
+    curl_multi_setopt(mMulti, CURLMOPT_MAX_TOTAL_CONNECTIONS, static_cast<long>(inMaximumConnections));
+    curl_multi_setopt(mMulti, CURLMOPT_MAXCONNECTS, static_cast<long>(inMaximumConnections));
+    epoll_event event{};
+    event.events = EPOLLIN;
+    event.data.fd = mWakeUp;
+    return epoll_ctl(mEpoll, EPOLL_CTL_ADD, mWakeUp, &event) == 0;
+}
+
+bool NetworkThread::Begin(std::shared_ptr<Exchange> inExchange) {
+    return Give(std::move(inExchange), &Orders::begin);
+}
+
+void NetworkThread::Drop(std::shared_ptr<Exchange> inExchange) {
+    Give(std::move(inExchange), &Orders::drop);
+}
+
+bool NetworkThread::Give(std::shared_ptr<Exchange> inExchange, Exchanges Orders::*inList) {
+    MutexLock lock(mMutex);
+    if (mIsStopped) {
+        return false;
+    }
+    (mOrders.*inList).push_back(std::move(inExchange));
+    if (std::exchange(mIsAsleep, false)) {
+        lock.Unlock();
+        Wake();
+    }
+    return true;
+}
+
+void NetworkThread::Wake() noexcept {
+    const std::uint64_t one = 1;
+    [[maybe_unused]] const auto written = write(mWakeUp, &one, sizeof one);  // full: it is awake already
+}
+
+void NetworkThread::Stop() {
+    {
+        MutexLock lock(mMutex);
+        mIsStopped = true;
+        mOrders.stop = true;
+        mIsAsleep = false;
+    }
+    Wake();
+    if (mThread.joinable()) {
+        mThread.join();
+    }
+}
+
+void NetworkThread::Run() {
+    do {
+        WaitForEvents();
+        if (!TakeOrders()) {
+            break;
+        }
+        RunEngineTimer();
+        CollectEnded();
+        CheckDeadlines();
+        if (!mEndedExchanges.empty()) {
+            mEnded(mEndedExchanges);
+            mEndedExchanges.clear();
+        }
+    } while (true);
+    while (!mTransfers.empty()) {
+        DropTransfer(*mTransfers.begin()->second.exchange);
+    }
+}
+
+/// Orders that came before the thread could say that it sleeps keep it awake.
+bool NetworkThread::MayFallAsleep() {
+    MutexLock lock(mMutex);
+    mIsAsleep = mOrders.IsEmpty();
+    return mIsAsleep;
+}
+
+int NetworkThread::MillisecondsToNextTimer(Clock::time_point inNow) const {
+    if (mTransfers.empty() && !mHasEngineTimer) {
+        return -1;
+    }
+    Clock::time_point next = mTransfers.empty() ? mEngineTimer : mNextSweep;
+    if (mHasEngineTimer) {
+        next = std::min(next, mEngineTimer);
+    }
+    const auto left = std::chrono::ceil<std::chrono::milliseconds>(next - inNow).count();
+    return left <= 0 ? 0 : static_cast<int>(std::min<long long>(left, 60000));
+}
+
+void NetworkThread::WaitForEvents() {
+    std::array<epoll_event, kEventsAtOnce> events;
+    const int wait = MayFallAsleep() ? MillisecondsToNextTimer(Clock::now()) : 0;
+    const int count = epoll_wait(mEpoll, events.data(), static_cast<int>(events.size()), wait);
+    {
+        MutexLock lock(mMutex);
+        mIsAsleep = false;
+    }
+    for (int i = 0; i < count; ++i) {
+        const epoll_event& event = events[static_cast<std::size_t>(i)];
+        if (event.data.fd == mWakeUp) {
+            std::uint64_t wakes = 0;
+            [[maybe_unused]] const auto size = read(mWakeUp, &wakes, sizeof wakes);
+            continue;
+        }
+        int running = 0;
+        curl_multi_socket_action(mMulti, event.data.fd, ActionsOf(event.events), &running);
+    }
+}
+
+/// False when the thread is to end.
+bool NetworkThread::TakeOrders() {
+    Orders orders;
+    {
+        MutexLock lock(mMutex);
+        std::swap(orders.begin, mOrders.begin);
+        std::swap(orders.drop, mOrders.drop);
+        orders.stop = mOrders.stop;
+    }
+    if (orders.stop) {
+        return false;
+    }
+    for (auto& exchange : orders.begin) {
+        BeginTransfer(std::move(exchange));
+    }
+    for (const auto& exchange : orders.drop) {
+        DropTransfer(*exchange);
+    }
+    return true;
+}
+
+void NetworkThread::RunEngineTimer() {
+    if (mHasEngineTimer && mEngineTimer <= Clock::now()) {
+        mHasEngineTimer = false;
+        int running = 0;
+        curl_multi_socket_action(mMulti, CURL_SOCKET_TIMEOUT, 0, &running);
+    }
+}
+
+void NetworkThread::CollectEnded() {
+    int left = 0;
+    while (const CURLMsg* message = curl_multi_info_read(mMulti, &left)) {
+        if (message->msg == CURLMSG_DONE) {
+            EndTransfer(message->easy_handle, message->data.result);
+        }
+    }
+}
+
+void NetworkThread::CheckDeadlines() {
+    if (mTransfers.empty()) {
+        return;
+    }
+    const auto now = Clock::now();
+    if (now < mNextSweep) {
+        return;
+    }
+    mNextSweep = now + mSweepEvery;
+    std::vector<std::pair<CURL*, CURLcode>> late;
+    for (const auto& [handle, transfer] : mTransfers) {
+        if (const CURLcode verdict = transfer.exchange->CheckDeadlines(now); verdict != CURLE_OK) {
+            late.emplace_back(handle, verdict);
+        }
+    }
+    for (const auto& [handle, verdict] : late) {
+        EndTransfer(handle, verdict);
+    }
+}
+
+void NetworkThread::BeginTransfer(std::shared_ptr<Exchange> inExchange) {
+    const auto now = Clock::now();
+    const auto& settings = inExchange->GetRequest().settings;
+    const auto shortest = std::chrono::milliseconds(
+        std::min({settings->limits.lowSpeedTime, settings->limits.responseTimeout}) / 4);
+    const auto sweep = std::clamp(shortest, kFastestSweep, kSlowestSweep);
+    if (mTransfers.empty() || sweep < mSweepEvery) {
+        mSweepEvery = sweep;
+        mNextSweep = now + mSweepEvery;
+    }
+    const IdleHandle idle = TakeHandle(settings);
+    if (!idle.handle) {
+        inExchange->Fail(CURLE_OUT_OF_MEMORY);
+        mEndedExchanges.push_back(std::move(inExchange));
+        return;
+    }
+    inExchange->Attach(idle.handle, now);
+    Transfer& transfer = mTransfers[idle.handle];
+    transfer = {this, std::move(inExchange), idle.preparedFor};
+    const bool isObserved = transfer.exchange->GetRequest().options.observer != nullptr;
+    curl_easy_setopt(idle.handle, CURLOPT_NOPROGRESS, isObserved ? 0L : 1L);
+    curl_easy_setopt(idle.handle, CURLOPT_XFERINFOFUNCTION, &NetworkThread::OnTransferProgress);
+    curl_easy_setopt(idle.handle, CURLOPT_XFERINFODATA, &transfer);
+    if (curl_multi_add_handle(mMulti, idle.handle) != CURLM_OK) {
+        EndTransfer(idle.handle, CURLE_FAILED_INIT);
+    }
+}
+
+void NetworkThread::DropTransfer(Exchange& ioExchange) {
+    if (CURL* handle = ioExchange.Handle()) {
+        const std::size_t before = mEndedExchanges.size();
+        EndTransfer(handle, CURLE_ABORTED_BY_CALLBACK);
+        mEndedExchanges.resize(before);
+    }
+}
+
+void NetworkThread::EndTransfer(CURL* inHandle, CURLcode inResult) {
+    const auto found = mTransfers.find(inHandle);
+    if (found == mTransfers.end()) {
+        return;
+    }
+    Transfer transfer = std::move(found->second);
+    curl_multi_remove_handle(mMulti, inHandle);
+    mTransfers.erase(found);
+    KeepHandle({transfer.exchange->Detach(inResult), std::move(transfer.preparedFor)});
+    mEndedExchanges.push_back(std::move(transfer.exchange));
+}
+
+NetworkThread::IdleHandle NetworkThread::TakeHandle(const shared_ptr<NetworkSettings const>& inSettings) {
+    IdleHandle idle{nullptr, nullptr};
+    if (!mIdleHandles.empty()) {
+        idle = std::move(mIdleHandles.back());
+        mIdleHandles.pop_back();
+    } else {
+        idle.handle = curl_easy_init();
+    }
+    if (idle.handle && idle.preparedFor != inSettings) {
+        curl_easy_reset(idle.handle);
+        Prepare(idle.handle, *inSettings);
+        idle.preparedFor = inSettings;
+    }
+    return idle;
+}
+
+void NetworkThread::KeepHandle(IdleHandle inHandle) {
+    if (mIdleHandles.size() >= kMostIdleHandles) {
+        curl_easy_cleanup(inHandle.handle);
+        return;
+    }
+    mIdleHandles.push_back(std::move(inHandle));
+}
+
+void NetworkThread::CloseAll() {
+    for (const IdleHandle& idle : std::exchange(mIdleHandles, {})) {
+        curl_easy_cleanup(idle.handle);
+    }
+    if (mMulti) {
+        curl_multi_cleanup(std::exchange(mMulti, nullptr));
+    }
+    for (int* descriptor : {&mEpoll, &mWakeUp}) {
+        if (*descriptor >= 0) {
+            close(std::exchange(*descriptor, -1));
+        }
+    }
+}
+
+int NetworkThread::OnSocketChange(CURL*, curl_socket_t inSocket, int inWhat, void* inThis, void* inSeen) {
+    auto& self = *static_cast<NetworkThread*>(inThis);
+    epoll_event event{};
+    event.data.fd = inSocket;
+    if (inWhat == CURL_POLL_REMOVE) {
+        epoll_ctl(self.mEpoll, EPOLL_CTL_DEL, inSocket, &event);
+        return 0;
+    }
+    event.events = EventsOf(inWhat);
+    if (epoll_ctl(self.mEpoll, inSeen ? EPOLL_CTL_MOD : EPOLL_CTL_ADD, inSocket, &event) != 0) {
+        epoll_ctl(self.mEpoll, inSeen ? EPOLL_CTL_ADD : EPOLL_CTL_MOD, inSocket, &event);
+    }
+    curl_multi_assign(self.mMulti, inSocket, &self);  // marks the socket as seen
+    return 0;
+}
+
+int NetworkThread::OnTimerChange(CURLM*, long inMilliseconds, void* inThis) {
+    auto& self = *static_cast<NetworkThread*>(inThis);
+    self.mHasEngineTimer = inMilliseconds >= 0;
+    self.mEngineTimer = Clock::now() + std::chrono::milliseconds(std::max(inMilliseconds, 0L));
+    return 0;
+}
+
+int NetworkThread::OnTransferProgress(void* inTransfer, curl_off_t inReceiveTotal, curl_off_t inReceived,
+                                      curl_off_t inSendTotal, curl_off_t inSent) {
+    const auto& transfer = *static_cast<Transfer*>(inTransfer);
+    const auto number = [](curl_off_t inValue) {
+        return static_cast<std::uint64_t>(std::max<curl_off_t>(inValue, 0));
+    };
+    if (transfer.exchange->NoteProgress(number(inSent), number(inSendTotal), number(inReceived),
+                                        number(inReceiveTotal))) {
+        transfer.owner->mProgressed(transfer.exchange);
+    }
+    return 0;
+}
+
+}  // namespace http
+}  // namespace ostnet

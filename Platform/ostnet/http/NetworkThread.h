@@ -1,0 +1,109 @@
+// The one thread that moves bytes: all transfers run on it, side by side.
+#pragma once
+
+#include <curl/curl.h>
+
+#include <chrono>
+#include <functional>
+#include <memory>
+#include <thread>
+#include <unordered_map>
+#include <vector>
+
+#include "ostcore/threads/Mutex.h"
+#include "ostnet/http/Exchange.h"
+
+namespace ostnet {
+namespace http {
+
+/// Runs transfers on the engine's event interface over epoll.
+///
+/// Orders (begin, drop) come in from any thread through a list; only when the thread sleeps does an order
+/// wake it, so that a busy thread takes many orders for one look at the list. Ended transfers leave in
+/// batches, on the network thread. A dropped exchange is not handed over.
+class NetworkThread {
+public:
+    using Exchanges = std::vector<std::shared_ptr<Exchange>>;
+    /// Takes the exchanges whose transfer has ended; runs on the network thread and must not block.
+    using Ended = std::function<void(Exchanges& ioEnded)>;
+    /// An exchange whose observer has something to hear, likewise.
+    using Progressed = std::function<void(const std::shared_ptr<Exchange>&)>;
+
+    NetworkThread(Ended inEnded, Progressed inProgressed, std::uint32_t inMaximumConnections);
+    ~NetworkThread();
+    NetworkThread(const NetworkThread&) = delete;
+    NetworkThread& operator=(const NetworkThread&) = delete;
+
+    /// False after Stop.
+    bool Begin(std::shared_ptr<Exchange> inExchange);
+    void Drop(std::shared_ptr<Exchange> inExchange);
+    /// Drops all transfers, closes all connections, joins the thread. May be called again.
+    void Stop();
+
+private:
+    using Clock = Exchange::Clock;
+    struct Orders {
+        Exchanges begin;
+        Exchanges drop;
+        bool stop = false;
+        bool IsEmpty() const noexcept { return begin.empty() && drop.empty() && !stop; }
+    };
+    struct Transfer {
+        NetworkThread* owner = nullptr;
+        std::shared_ptr<Exchange> exchange;
+        shared_ptr<NetworkSettings const> preparedFor;
+    };
+    struct IdleHandle {
+        CURL* handle;
+        shared_ptr<NetworkSettings const> preparedFor;
+    };
+
+    void Run();
+    bool OpenEngine(std::uint32_t inMaximumConnections);
+    bool MayFallAsleep();
+    void WaitForEvents();
+    bool TakeOrders();
+    void RunEngineTimer();
+    void CollectEnded();
+    void CheckDeadlines();
+    int MillisecondsToNextTimer(Clock::time_point inNow) const;
+
+    void BeginTransfer(std::shared_ptr<Exchange> inExchange);
+    void DropTransfer(Exchange& ioExchange);
+    void EndTransfer(CURL* inHandle, CURLcode inResult);
+    IdleHandle TakeHandle(const shared_ptr<NetworkSettings const>& inSettings);
+    void KeepHandle(IdleHandle inHandle);
+    bool Give(std::shared_ptr<Exchange> inExchange, Exchanges Orders::*inList);
+    void Wake() noexcept;
+    void CloseAll();
+
+    static int OnSocketChange(CURL* inHandle, curl_socket_t inSocket, int inWhat, void* inThis, void* inSeen);
+    static int OnTimerChange(CURLM* inMulti, long inMilliseconds, void* inThis);
+    static int OnTransferProgress(void* inTransfer, curl_off_t inReceiveTotal, curl_off_t inReceived,
+                                  curl_off_t inSendTotal, curl_off_t inSent);
+
+    const Ended mEnded;
+    const Progressed mProgressed;
+
+    ostcore::threads::Mutex mMutex;
+    Orders mOrders ZO_GUARDED_BY(mMutex);
+    bool mIsAsleep ZO_GUARDED_BY(mMutex) = false;
+    bool mIsStopped ZO_GUARDED_BY(mMutex) = false;
+
+    // On the network thread only, once it has started.
+    CURLM* mMulti = nullptr;
+    int mEpoll = -1;
+    int mWakeUp = -1;
+    std::unordered_map<CURL*, Transfer> mTransfers;
+    std::vector<IdleHandle> mIdleHandles;
+    Exchanges mEndedExchanges;
+    bool mHasEngineTimer = false;
+    Clock::time_point mEngineTimer;
+    Clock::time_point mNextSweep;
+    Clock::duration mSweepEvery;
+
+    std::thread mThread;
+};
+
+}  // namespace http
+}  // namespace ostnet

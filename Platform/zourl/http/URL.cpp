@@ -1,0 +1,72 @@
+#include "zourl/http/URL.h"
+
+#include <boost/url/parse.hpp>
+#include <boost/url/src.hpp>
+#include <boost/url/url_view.hpp>
+
+#include "ostcore/utility/StringConversion.h"
+
+namespace zourl {
+namespace http {
+namespace {
+
+std::string ToString(boost::core::string_view inText) {
+    return {inText.data(), inText.size()};
+}
+
+}  // namespace
+
+std::uint16_t URL::GetEffectivePort() const noexcept {
+    if (mPort) {
+        return *mPort;
+    }
+    return mIsSecure ? 443 : 80;
+}
+
+std::string URL::GetOrigin() const {
+    std::string origin = std::string(GetScheme()) + "://" + mHost;
+    if (GetEffectivePort() != (mIsSecure ? 443 : 80)) {
+        origin += ":" + std::to_string(*mPort);
+    }
+    return origin;
+}
+
+bool URL::HasSameOrigin(const URL& inOther) const noexcept {
+    return mIsSecure == inOther.mIsSecure && GetEffectivePort() == inOther.GetEffectivePort() &&
+           mHost == inOther.mHost;
+}
+
+ostcore::optional<URL> Create(std::string_view inText) {
+    const auto parsed = boost::urls::parse_uri(boost::core::string_view(inText.data(), inText.size()));
+    if (!parsed) {
+        return {};
+    }
+    const boost::urls::url_view view = *parsed;
+    const bool isSecure = view.scheme_id() == boost::urls::scheme::https;
+    if ((!isSecure && view.scheme_id() != boost::urls::scheme::http) || !view.has_authority() ||
+        view.has_userinfo() || view.encoded_host().empty() || (view.has_port() && view.port_number() == 0)) {
+        return {};
+    }
+    URL url;
+    url.mIsSecure = isSecure;
+    url.mText = inText;
+    url.mHost = ostcore::utility::FoldCaseASCII(ToString(view.encoded_host()));
+    url.mPath = ToString(view.encoded_path());
+    url.mQuery = view.has_query() ? ToString(view.encoded_query()) : std::string();
+    if (view.has_port()) {
+        url.mPort = view.port_number();
+    }
+    return url;
+}
+
+bool Create(std::string_view inText, URL& outURL) {
+    auto url = Create(inText);
+    if (!url) {
+        return false;
+    }
+    outURL = std::move(*url);
+    return true;
+}
+
+}  // namespace http
+}  // namespace zourl
