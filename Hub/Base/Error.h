@@ -1,0 +1,23 @@
+// The one exception that a request or a command ends with when it cannot be answered as asked.
+#pragma once
+
+#include <stdexcept>
+#include <string>
+
+namespace zohub {
+
+/// Carries the HTTP status, a stable short code and a text that says what was tried and what to do next.
+class Failure : public std::runtime_error {
+public:
+    Failure(int inStatus, std::string inCode, std::string const& inMessage)
+        : std::runtime_error(inMessage), mStatus(inStatus), mCode(std::move(inCode)) {}
+
+    int Status() const { return mStatus; }
+    std::string const& Code() const { return mCode; }
+
+private:
+    int mStatus;
+    std::string mCode;
+};
+
+}  // namespace zohub

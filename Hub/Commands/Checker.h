@@ -1,0 +1,21 @@
+// Verifies all that the hub holds: hashes, references, trees, commits.
+#pragma once
+
+#include <string>
+#include <vector>
+
+#include "Store/Storage.h"
+
+namespace zohub {
+
+struct CheckReport {
+    std::vector<std::string> problems;
+    std::size_t objects = 0;
+    std::size_t contents = 0;
+    std::size_t commits = 0;
+    std::size_t unreferenced = 0;  ///< left over from imports that did not end; harmless
+};
+
+CheckReport CheckStorage(Storage& inStorage);
+
+}  // namespace zohub

@@ -1,0 +1,59 @@
+// The network side of the hub: listens, reads bounded requests, hands them to workers, writes the answers.
+#pragma once
+
+#include <boost/asio/ssl/context.hpp>
+#include <chrono>
+#include <cstdint>
+#include <functional>
+#include <memory>
+#include <string>
+
+#include "Http/Message.h"
+
+namespace zohub {
+
+struct ServerLimits {
+    std::chrono::milliseconds idle{120000};      ///< between two requests of one connection
+    std::chrono::milliseconds header{20000};     ///< for the whole head of a request, and for a TLS handshake
+    std::chrono::milliseconds bodyGrace{30000};  ///< a body or answer may take this long ...
+    std::uint64_t minimumRate = 16 * 1024;       ///< ... plus its size divided by this, in bytes per second
+    std::chrono::milliseconds drain{10000};      ///< how long a stop waits for requests in flight
+    std::uint32_t maxHeader = 32 * 1024;
+    std::uint64_t maxBody = 256ull << 20;
+    std::uint64_t maxAnonymousBody = 64 * 1024;  ///< without a token cookie
+    std::uint64_t maxBodiesInFlight = 1ull << 30;
+    std::size_t maxConnections = 4096;
+    std::size_t ioThreads = 2;
+    std::size_t workerThreads = 4;
+};
+
+/// Runs a request to its end and never throws. Called on worker threads, several at a time.
+using RequestHandler = std::function<Response(Request const&)>;
+/// True for requests that are slow on purpose; they have one thread of their own.
+using SlowRequestTest = std::function<bool(Request const&)>;
+
+class Server {
+public:
+    Server(ServerLimits const& inLimits, RequestHandler inHandler, SlowRequestTest inIsSlow);
+    /// Stops.
+    ~Server();
+    Server(Server const&) = delete;
+    Server& operator=(Server const&) = delete;
+
+    /// Bind and listen; port 0 picks a free one. Give the port in use. Throw std::runtime_error.
+    std::uint16_t ListenPlain(std::string const& inAddress, std::uint16_t inPort);
+    std::uint16_t ListenTls(std::string const& inAddress, std::uint16_t inPort,
+                            std::shared_ptr<boost::asio::ssl::context> inContext);
+
+    /// Starts the threads and returns.
+    void Start();
+    /// Accepts no more, lets requests in flight end within the drain time, closes the rest. May be called
+    /// twice.
+    void Stop();
+
+private:
+    class Implementation;
+    std::shared_ptr<Implementation> mImplementation;
+};
+
+}  // namespace zohub

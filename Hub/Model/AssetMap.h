@@ -1,0 +1,43 @@
+// The assets of a tree: an immutable map from asset identifier to the hash of the asset's state.
+//
+// It is a hash trie whose shape depends on nothing but what it holds: equal maps have equal roots, two
+// commits share all parts that are equal, and one change among 50,000 assets writes a handful of small
+// objects.
+#pragma once
+
+#include <cstdint>
+#include <functional>
+#include <map>
+#include <optional>
+#include <string>
+
+#include "Store/Storage.h"
+
+namespace zohub {
+
+class AssetMap {
+public:
+    AssetMap(Transaction& inTransaction, std::string inRoot);
+
+    std::optional<std::string> Find(std::string const& inAssetId) const;
+
+    /// All entries, in no order that means something.
+    std::map<std::string, std::string> All() const;
+
+    /// An empty optional removes the asset.
+    using Changes = std::map<std::string, std::optional<std::string>>;
+
+    struct Written {
+        std::string root;  ///< empty for an empty map
+        std::uint64_t count = 0;
+    };
+
+    /// Writes the map with the changes applied; this object keeps showing the old one.
+    Written Apply(Changes const& inChanges) const;
+
+private:
+    Transaction& mTransaction;
+    std::string mRoot;
+};
+
+}  // namespace zohub

@@ -1,0 +1,259 @@
+// The JSON documents of the protocol.
+#include "Routes/Documents.h"
+
+#include "Base/Text.h"
+#include "Http/Message.h"
+
+namespace zohub {
+
+namespace {
+
+// ,"key":"value" with the comma left out after an opening brace.
+void AppendMember(std::string& ioTarget, std::string_view inKey, std::string_view inValue) {
+    if (ioTarget.back() != '{')
+        ioTarget += ',';
+    ioTarget += '"';
+    ioTarget += inKey;
+    ioTarget += "\":";
+    AppendJsonString(ioTarget, inValue);
+}
+
+void AppendRaw(std::string& ioTarget, std::string_view inKey, std::string_view inJson) {
+    if (ioTarget.back() != '{')
+        ioTarget += ',';
+    ioTarget += '"';
+    ioTarget += inKey;
+    ioTarget += "\":";
+    ioTarget += inJson;
+}
+
+void BeginLinks(std::string& ioTarget) {
+    ioTarget += ioTarget.back() == '{' ? "\"links\":" : ",\"links\":";
+}
+
+}  // namespace
+
+void LinkWriter::Write(std::string_view inBase, std::string_view inRelation, std::string_view inHref) {
+    mTarget += mIsFirst ? "{\"rel\":\"" : ",{\"rel\":\"";
+    mIsFirst = false;
+    mTarget += inBase;
+    mTarget += inRelation;
+    mTarget += "\",\"href\":";
+    AppendJsonString(mTarget, inHref);
+    mTarget += '}';
+}
+
+DocumentWriter::DocumentWriter(std::string const& inApi, View const& inView)
+    : mApi(inApi),
+      mView(inView),
+      mLivePrefix(inApi + "/productions/" + PercentEncode(inView.line.id)),
+      mPrefix(inView.isPinned ? mLivePrefix + "/commits/" + PercentEncode(inView.commit.id) : mLivePrefix) {}
+
+std::string DocumentWriter::TagOf(std::string_view inKind, std::string_view inWhatDecides) const {
+    std::string text(inKind);
+    text += mView.isPinned ? "\npinned\n" : "\nlive\n";
+    text += IsWritable() ? "w\n" : "r\n";
+    text += inWhatDecides;
+    return MakeETag(text);
+}
+
+std::string DocumentWriter::ProductionTag() const {
+    return TagOf("production", mView.commit.id);
+}
+
+std::string DocumentWriter::AssetTag(std::string_view inHash) const {
+    return TagOf("asset", inHash);
+}
+
+std::string DocumentWriter::EnclosureTag(EnclosureState const& inEnclosure) const {
+    return TagOf("enclosure", inEnclosure.id + "\n" + inEnclosure.name + "\n" + inEnclosure.type + "\n" +
+                                  inEnclosure.content);
+}
+
+std::string DocumentWriter::RenditionTag(RenditionState const& inRendition) const {
+    return TagOf("rendition", inRendition.id + "\n" + inRendition.type + "\n" + inRendition.content);
+}
+
+std::string DocumentWriter::AssetHref(std::string const& inAssetId) const {
+    return mPrefix + "/assets/" + PercentEncode(inAssetId);
+}
+
+std::string DocumentWriter::LiveHref(std::string const& inHref) const {
+    return mLivePrefix + inHref.substr(mPrefix.size());
+}
+
+void DocumentWriter::AppendIdentity(std::string& ioTarget) const {
+    AppendMember(ioTarget, "zo:productionId", mView.line.id);
+    AppendMember(ioTarget, "zo:commitId", mView.commit.id);
+    AppendMember(ioTarget, "zo:owner", mView.line.owner);
+    AppendMember(ioTarget, "created", FormatTime(mView.line.created));
+    AppendMember(ioTarget, "modified", FormatTime(mView.commit.time));
+    if (!mView.line.metadata.empty())
+        AppendRaw(ioTarget, "metadata", mView.line.metadata);
+    AppendRaw(ioTarget, "properties", mView.tree.properties);
+}
+
+void DocumentWriter::AppendProductionLinks(std::string& ioTarget) const {
+    BeginLinks(ioTarget);
+    LinkWriter links(ioTarget);
+    bool const isTemplate = mView.line.kind == kLineTemplate;
+    links.Plain("self", mPrefix);
+    links.Plain("latest-version", mLivePrefix);
+    links.Plain("up", mApi + (isTemplate ? "/productions/templates" : "/productions"));
+    links.Named("/assets", mPrefix + "/assets");
+    links.Named("/assets#full", mPrefix + "/assets-full");
+    links.Named("/assets/asset#byId", mLivePrefix + "/commits/{commitId}/assets/{assetId}");
+    links.Named("/enclosures", mPrefix + "/enclosures");
+    if (IsWritable()) {
+        links.Plain("edit", mLivePrefix);
+        links.Named("/assets/asset#create", mLivePrefix + "/assets");
+    }
+    if (!mView.isPinned)
+        links.Named(isTemplate ? "/productions/production#create-production" : "/productions/production#copy",
+                    mLivePrefix + "/copy");
+}
+
+std::string DocumentWriter::Production() const {
+    std::string text = "{";
+    AppendIdentity(text);
+    AppendProductionLinks(text);
+    text += '}';
+    return text;
+}
+
+void DocumentWriter::AppendProductionItem(std::string& ioTarget) const {
+    ioTarget += '{';
+    AppendIdentity(ioTarget);
+    AppendMember(ioTarget, "zo:lastModified", FormatTime(mView.line.modified));
+    AppendMember(ioTarget, "zo:lastModifiedOfAllSessions", FormatTime(mView.line.modified));
+    BeginLinks(ioTarget);
+    {
+        LinkWriter links(ioTarget);
+        links.Plain("self", mLivePrefix);
+        links.Plain("latest-version", mLivePrefix);
+        if (mView.line.kind == kLineTemplate)
+            links.Named("/productions/production#create-production", mLivePrefix + "/copy");
+    }
+    ioTarget += '}';
+}
+
+void DocumentWriter::AppendAsset(std::string& ioTarget, AssetState const& inAsset, std::string const& inHash,
+                                 bool inIsFull) const {
+    std::string const href = AssetHref(inAsset.id);
+    ioTarget += '{';
+    AppendMember(ioTarget, "zo:assetId", inAsset.id);
+    AppendMember(ioTarget, "zo:etag", AssetTag(inHash));
+    AppendMember(ioTarget, "zo:assetContentId", inHash);
+    AppendRaw(ioTarget, "properties", inAsset.properties);
+    BeginLinks(ioTarget);
+    {
+        LinkWriter links(ioTarget);
+        links.Plain("self", href);
+        links.Plain("latest-version", LiveHref(href));
+        links.Named("/enclosures", href + "/enclosures");
+        links.Named("/renditions", href + "/renditions");
+        if (!inAsset.locator.empty())
+            links.Plain("locator", mApi + "/locators/" + PercentEncode(inAsset.locator));
+        if (IsWritable()) {
+            links.Plain("edit", href);
+            links.Plain("delete", href);
+            links.Named("/enclosures/enclosure#create", href + "/enclosures");
+            links.Named("/renditions/rendition#create", href + "/renditions");
+        }
+    }
+    if (inIsFull) {
+        ioTarget += ",\"enclosures\":";
+        AppendEnclosures(ioTarget, href, inAsset.enclosures);
+        ioTarget += ",\"renditions\":";
+        AppendRenditions(ioTarget, href, inAsset.renditions);
+    }
+    ioTarget += '}';
+}
+
+void DocumentWriter::AppendEnclosures(std::string& ioTarget, std::string const& inOwner,
+                                      std::vector<EnclosureState> const& inEnclosures) const {
+    ioTarget += "{\"enclosures\":[";
+    for (auto const& enclosure : inEnclosures) {
+        if (ioTarget.back() != '[')
+            ioTarget += ',';
+        AppendEnclosure(ioTarget, inOwner, enclosure);
+    }
+    ioTarget += ']';
+    BeginLinks(ioTarget);
+    {
+        LinkWriter links(ioTarget);
+        links.Plain("self", inOwner + "/enclosures");
+        links.Plain("latest-version", LiveHref(inOwner) + "/enclosures");
+        links.Named("/enclosures/enclosure#byContentId", mLivePrefix + "/contents/enclosures/{contentId}");
+        if (IsWritable())
+            links.Plain("create", inOwner + "/enclosures");
+    }
+    ioTarget += '}';
+}
+
+void DocumentWriter::AppendEnclosure(std::string& ioTarget, std::string const& inOwner,
+                                     EnclosureState const& inEnclosure) const {
+    std::string const href = inOwner + "/enclosures/" + PercentEncode(inEnclosure.id);
+    ioTarget += '{';
+    AppendMember(ioTarget, "zo:etag", EnclosureTag(inEnclosure));
+    AppendMember(ioTarget, "zo:enclosureContentId", inEnclosure.content);
+    AppendMember(ioTarget, "zo:enclosureId", inEnclosure.id);
+    AppendMember(ioTarget, "name", inEnclosure.name);
+    BeginLinks(ioTarget);
+    {
+        LinkWriter links(ioTarget);
+        links.Plain("self", href);
+        links.Plain("latest-version", LiveHref(href));
+        links.Named("/enclosures/enclosure", mLivePrefix + "/payloads/enclosures/" + inEnclosure.content);
+        if (IsWritable()) {
+            links.Plain("edit", href);
+            links.Plain("delete", href);
+        }
+    }
+    ioTarget += '}';
+}
+
+void DocumentWriter::AppendRenditions(std::string& ioTarget, std::string const& inOwner,
+                                      std::vector<RenditionState> const& inRenditions) const {
+    ioTarget += "{\"renditions\":[";
+    for (auto const& rendition : inRenditions) {
+        if (ioTarget.back() != '[')
+            ioTarget += ',';
+        AppendRendition(ioTarget, inOwner, rendition);
+    }
+    ioTarget += ']';
+    BeginLinks(ioTarget);
+    {
+        LinkWriter links(ioTarget);
+        links.Plain("self", inOwner + "/renditions");
+        links.Plain("latest-version", LiveHref(inOwner) + "/renditions");
+        if (IsWritable())
+            links.Plain("create", inOwner + "/renditions");
+    }
+    ioTarget += '}';
+}
+
+void DocumentWriter::AppendRendition(std::string& ioTarget, std::string const& inOwner,
+                                     RenditionState const& inRendition) const {
+    std::string const href = inOwner + "/renditions/" + PercentEncode(inRendition.id);
+    ioTarget += '{';
+    AppendMember(ioTarget, "zo:renditionId", inRendition.id);
+    AppendMember(ioTarget, "zo:renditionContentId", inRendition.content);
+    ioTarget += ",\"properties\":{\"zo:mimeType\":";
+    AppendJsonString(ioTarget, inRendition.type);
+    ioTarget += '}';
+    BeginLinks(ioTarget);
+    {
+        LinkWriter links(ioTarget);
+        links.Plain("self", href);
+        links.Plain("latest-version", LiveHref(href));
+        links.Named("/renditions/rendition", mLivePrefix + "/payloads/renditions/" + inRendition.content);
+        if (IsWritable()) {
+            links.Plain("edit-media", href + "/media");
+            links.Plain("delete", href);
+        }
+    }
+    ioTarget += '}';
+}
+
+}  // namespace zohub

@@ -1,0 +1,81 @@
+// The JSON documents of the protocol, written straight into text: lists of many thousand items are made of
+// them.
+#pragma once
+
+#include <string>
+#include <string_view>
+
+#include "Model/Repository.h"
+
+namespace zohub {
+
+inline constexpr std::string_view kRelationBase = "http://ns.meridane.example/zo/rel";
+
+/// Writes the value of "links": an array of link objects.
+class LinkWriter {
+public:
+    explicit LinkWriter(std::string& ioTarget) : mTarget(ioTarget) { mTarget += '['; }
+    LinkWriter(LinkWriter const&) = delete;
+    LinkWriter& operator=(LinkWriter const&) = delete;
+    ~LinkWriter() { mTarget += ']'; }
+
+    /// A relation that is a plain word, such as "self".
+    void Plain(std::string_view inRelation, std::string_view inHref) { Write({}, inRelation, inHref); }
+    /// A relation below kRelationBase, such as "/assets".
+    void Named(std::string_view inRelation, std::string_view inHref) {
+        Write(kRelationBase, inRelation, inHref);
+    }
+
+private:
+    void Write(std::string_view inBase, std::string_view inRelation, std::string_view inHref);
+
+    std::string& mTarget;
+    bool mIsFirst = true;
+};
+
+/// Writes documents of one view of a production. All hrefs begin with the address that the client used.
+class DocumentWriter {
+public:
+    DocumentWriter(std::string const& inApi, View const& inView);
+
+    std::string LivePrefix() const { return mLivePrefix; }  ///< ".../productions/<id>"
+    std::string Prefix() const { return mPrefix; }          ///< with the commit when the view is pinned
+
+    std::string ProductionTag() const;
+    std::string AssetTag(std::string_view inHash) const;
+    std::string EnclosureTag(EnclosureState const& inEnclosure) const;
+    std::string RenditionTag(RenditionState const& inRendition) const;
+
+    std::string Production() const;
+    /// One item of a production list.
+    void AppendProductionItem(std::string& ioTarget) const;
+
+    void AppendAsset(std::string& ioTarget, AssetState const& inAsset, std::string const& inHash,
+                     bool inIsFull) const;
+
+    /// inOwner is the prefix of an asset or of the production.
+    void AppendEnclosures(std::string& ioTarget, std::string const& inOwner,
+                          std::vector<EnclosureState> const& inEnclosures) const;
+    void AppendEnclosure(std::string& ioTarget, std::string const& inOwner,
+                         EnclosureState const& inEnclosure) const;
+    void AppendRenditions(std::string& ioTarget, std::string const& inOwner,
+                          std::vector<RenditionState> const& inRenditions) const;
+    void AppendRendition(std::string& ioTarget, std::string const& inOwner,
+                         RenditionState const& inRendition) const;
+
+    std::string AssetHref(std::string const& inAssetId) const;
+    bool IsWritable() const { return mView.mayWrite && !mView.isPinned; }
+
+private:
+    std::string TagOf(std::string_view inKind, std::string_view inWhatDecides) const;
+    std::string LiveHref(std::string const& inHref) const;
+    void AppendIdentity(std::string& ioTarget) const;
+    void AppendProductionLinks(std::string& ioTarget) const;
+
+    std::string const& mApi;
+    View const& mView;
+    std::string const mLivePrefix;
+    std::string const mPrefix;
+};
+
+}  // namespace zohub

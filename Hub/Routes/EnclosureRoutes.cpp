@@ -1,0 +1,168 @@
+// Enclosures of assets and productions: lists, creation, metadata, payloads, and both by content identifier.
+#include "Base/Digest.h"
+#include "Base/Error.h"
+#include "Base/Text.h"
+#include "Http/Multipart.h"
+#include "Routes/ItemOwner.h"
+
+namespace zohub {
+
+namespace {
+
+constexpr std::size_t kMaxEnclosures = 1000;
+constexpr char kDefaultType[] = "application/octet-stream";
+
+Response EnclosureResponse(Call& ioCall, ItemOwner const& inOwner, EnclosureState const& inEnclosure,
+                           int inStatus) {
+    DocumentWriter const writer(ioCall.api, inOwner.GetView());
+    std::string text;
+    writer.AppendEnclosure(text, inOwner.Href(), inEnclosure);
+    Response response = JsonResponse(inStatus, std::move(text));
+    response.etag = writer.EnclosureTag(inEnclosure);
+    if (inStatus == 201)
+        response.headers.emplace_back("Location",
+                                      inOwner.Href() + "/enclosures/" + PercentEncode(inEnclosure.id));
+    return response;
+}
+
+Response ListEnclosures(Call& ioCall, OwnerKind inKind) {
+    ItemOwner owner(ioCall, inKind);
+    std::string text;
+    DocumentWriter(ioCall.api, owner.GetView()).AppendEnclosures(text, owner.Href(), owner.Enclosures());
+    return JsonResponse(200, std::move(text));
+}
+
+Response LoadEnclosure(Call& ioCall, OwnerKind inKind) {
+    ItemOwner owner(ioCall, inKind);
+    return EnclosureResponse(ioCall, owner, owner.GetEnclosure(ioCall.parameters[inKind.NextParameter()]),
+                             200);
+}
+
+std::string TypeOf(FormPart const& inPart) {
+    return inPart.contentType.empty() ? kDefaultType : inPart.contentType;
+}
+
+Response CreateEnclosure(Call& ioCall, OwnerKind inKind) {
+    Form const form(ioCall.request);
+    ItemOwner owner = ItemOwner::ForWriting(ioCall, inKind);
+    FormPart const& payload = form.Get(":enclosure");
+    EnclosureState enclosure;
+    enclosure.id = NewGuid();
+    enclosure.name = std::string(form.Get(":name").bytes);
+    if (!IsEnclosureName(enclosure.name))
+        throw Failure(
+            400, "name-invalid",
+            "An enclosure's name is 1 to 1024 bytes of UTF-8 without control characters, backslashes, a "
+            "leading slash or \"..\".");
+    for (auto const& other : owner.Enclosures())
+        if (other.name == enclosure.name)
+            throw Failure(409, "enclosure-exists",
+                          "There is an enclosure of that name already; write to its edit address instead.");
+    if (owner.Enclosures().size() >= kMaxEnclosures)
+        throw Failure(413, "too-many-enclosures", "No more enclosures can be put here; remove some first.");
+    enclosure.type = TypeOf(payload);
+    enclosure.size = payload.bytes.size();
+    enclosure.content = ioCall.repository.AddContent(payload.bytes);
+    owner.Enclosures().push_back(enclosure);
+    owner.Commit(ioCall, "Added an enclosure");
+    return EnclosureResponse(ioCall, owner, enclosure, 201);
+}
+
+Response PutEnclosure(Call& ioCall, OwnerKind inKind) {
+    Form const form(ioCall.request);
+    ItemOwner owner = ItemOwner::ForWriting(ioCall, inKind);
+    EnclosureState& enclosure = owner.GetEnclosure(ioCall.parameters[inKind.NextParameter()]);
+    RequireMatch(ioCall.request, DocumentWriter(ioCall.api, owner.GetView()).EnclosureTag(enclosure),
+                 "The enclosure");
+    FormPart const& payload = form.Get(":enclosure");
+    std::string const content = ioCall.repository.AddContent(payload.bytes);
+    if (content != enclosure.content) {
+        enclosure.content = content;
+        enclosure.size = payload.bytes.size();
+        if (!payload.contentType.empty())
+            enclosure.type = payload.contentType;
+        owner.Commit(ioCall, "Changed an enclosure");
+    }
+    return EnclosureResponse(ioCall, owner, enclosure, 200);
+}
+
+Response DeleteEnclosure(Call& ioCall, OwnerKind inKind) {
+    ItemOwner owner = ItemOwner::ForWriting(ioCall, inKind);
+    EnclosureState const enclosure = owner.GetEnclosure(ioCall.parameters[inKind.NextParameter()]);
+    RequireMatch(ioCall.request, DocumentWriter(ioCall.api, owner.GetView()).EnclosureTag(enclosure),
+                 "The enclosure");
+    std::erase_if(owner.Enclosures(), [&](EnclosureState const& e) { return e.id == enclosure.id; });
+    owner.Commit(ioCall, "Removed an enclosure");
+    return EmptyResponse(204);
+}
+
+ReferenceRecord GetReference(Call& ioCall, char const* inKind) {
+    View const view = OpenView(ioCall, false);
+    auto reference = ioCall.transaction.FindReference(view.line.production, inKind, ioCall.parameters[1]);
+    if (!reference)
+        throw Failure(404, "not-found", "This production has no content with that identifier.");
+    return std::move(*reference);
+}
+
+// The document of an enclosure that had this content in some commit; it can be read, not changed.
+Response EnclosureByContent(Call& ioCall) {
+    ReferenceRecord const reference = GetReference(ioCall, kReferenceEnclosure);
+    View view = OpenView(ioCall, false);
+    view.mayWrite = false;
+    EnclosureState const enclosure{reference.item, reference.name, reference.type, reference.key, 0};
+    Json document = Json::object();
+    document["zo:enclosureContentId"] = enclosure.content;
+    document["zo:enclosureId"] = enclosure.id;
+    document["name"] = enclosure.name;
+    std::string const prefix = DocumentWriter(ioCall.api, view).LivePrefix();
+    document["links"] =
+        Json::array({{{"rel", "self"}, {"href", prefix + "/contents/enclosures/" + enclosure.content}},
+                     {{"rel", std::string(kRelationBase) + "/enclosures/enclosure"},
+                      {"href", prefix + "/payloads/enclosures/" + enclosure.content}}});
+    return JsonResponse(200, JsonText(document));
+}
+
+Response Payload(Call& ioCall, char const* inKind) {
+    ReferenceRecord const reference = GetReference(ioCall, inKind);
+    Response response;
+    response.etag = "\"" + reference.key + "\"";
+    response.isImmutable = true;
+    if (ioCall.HasCurrent(response.etag))
+        return response;
+    auto bytes = ioCall.transaction.FindContent(reference.key);
+    if (!bytes)
+        throw std::runtime_error("the content " + reference.key + " is missing; run zohub check");
+    response.SetBody(std::move(*bytes), reference.type);
+    return response;
+}
+
+}  // namespace
+
+void AddEnclosureRoutes(std::vector<Route>& ioRoutes) {
+    for (bool isAsset : {false, true}) {
+        for (bool isPinned : {false, true}) {
+            OwnerKind const kind{isAsset, isPinned};
+            std::string const list = kind.Pattern() + "/enclosures";
+            ioRoutes.push_back(
+                {"GET", list, SignIn::Needed, [kind](Call& ioCall) { return ListEnclosures(ioCall, kind); }});
+            ioRoutes.push_back({"GET", list + "/{}", SignIn::Needed,
+                                [kind](Call& ioCall) { return LoadEnclosure(ioCall, kind); }});
+            if (isPinned)
+                continue;
+            ioRoutes.push_back({"POST", list, SignIn::Needed,
+                                [kind](Call& ioCall) { return CreateEnclosure(ioCall, kind); }});
+            ioRoutes.push_back({"PUT", list + "/{}", SignIn::Needed,
+                                [kind](Call& ioCall) { return PutEnclosure(ioCall, kind); }});
+            ioRoutes.push_back({"DELETE", list + "/{}", SignIn::Needed,
+                                [kind](Call& ioCall) { return DeleteEnclosure(ioCall, kind); }});
+        }
+    }
+    std::string const production = OwnerKind().Pattern();
+    ioRoutes.push_back({"GET", production + "/contents/enclosures/{}", SignIn::Needed, EnclosureByContent});
+    ioRoutes.push_back({"GET", production + "/payloads/enclosures/{}", SignIn::Needed,
+                        [](Call& ioCall) { return Payload(ioCall, kReferenceEnclosure); }});
+    ioRoutes.push_back({"GET", production + "/payloads/renditions/{}", SignIn::Needed,
+                        [](Call& ioCall) { return Payload(ioCall, kReferenceRendition); }});
+}
+
+}  // namespace zohub

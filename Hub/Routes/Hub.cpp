@@ -1,0 +1,227 @@
+// The way of a request: route, transaction, sign-in, idempotency, handler, conditional answer.
+#include "Routes/Hub.h"
+
+#include <iostream>
+#include <set>
+
+#include "Base/Digest.h"
+#include "Base/Error.h"
+#include "Base/Text.h"
+#include "Routes/RouteTable.h"
+
+namespace zohub {
+
+namespace {
+
+constexpr std::size_t kMaxIdempotencyKey = 128;
+constexpr char kLoginSegments[] = "content/zo/api/v1/system/login";
+
+std::string JoinedPath(Request const& inRequest) {
+    std::string path;
+    for (auto const& segment : inRequest.segments)
+        path += (path.empty() ? "" : "/") + segment;
+    return path;
+}
+
+std::string Fingerprint(Request const& inRequest) {
+    return Sha256Hex(inRequest.method + "\n" + inRequest.target + "\n" + Sha256Hex(inRequest.body));
+}
+
+Response AnswerOf(AnswerRecord const& inRecord) {
+    Response response;
+    response.status = inRecord.status;
+    Json const headers = Json::parse(inRecord.headers);
+    for (auto const& [name, value] : headers.items()) {
+        if (name == "ETag")
+            response.etag = value.get<std::string>();
+        else if (name == "Content-Type")
+            response.contentType = value.get<std::string>();
+        else
+            response.headers.emplace_back(name, value.get<std::string>());
+    }
+    if (!response.contentType.empty())
+        response.body = std::make_shared<Body const>(inRecord.body);
+    return response;
+}
+
+AnswerRecord RecordOf(Response const& inResponse, Call const& inCall, std::string const& inKey) {
+    Json headers = Json::object();
+    for (auto const& [name, value] : inResponse.headers)
+        headers[name] = value;
+    if (!inResponse.etag.empty())
+        headers["ETag"] = inResponse.etag;
+    if (!inResponse.contentType.empty())
+        headers["Content-Type"] = inResponse.contentType;
+    return {inCall.actor.name,
+            inKey,
+            Fingerprint(inCall.request),
+            inResponse.status,
+            JsonText(headers),
+            inResponse.body ? inResponse.body->Plain() : std::string(),
+            inCall.now};
+}
+
+void FinishRead(Request const& inRequest, Response& ioResponse) {
+    if (ioResponse.status != 200)
+        return;
+    if (ioResponse.etag.empty() && ioResponse.body)
+        ioResponse.etag = MakeETag(ioResponse.body->Plain());
+    if (!IfNoneMatchHits(inRequest, ioResponse.etag))
+        return;
+    ioResponse.status = 304;
+    ioResponse.body.reset();
+    ioResponse.contentType.clear();
+}
+
+// Whose token is it? Leaves the actor empty when the request has none that is valid.
+void Identify(Call& ioCall) {
+    std::string const token = ioCall.request.Cookie("login-token");
+    if (token.empty() || token.size() > 256)
+        return;
+    std::string const hash = Sha256Hex(token);
+    auto const record = ioCall.transaction.FindToken(hash);
+    if (!record || record->expires <= ioCall.now)
+        return;
+    auto const user = ioCall.transaction.FindUser(record->user);
+    if (!user)
+        return;
+    ioCall.actor = {user->name, user->isAdmin};
+    ioCall.tokenHash = hash;
+}
+
+}  // namespace
+
+struct Hub::CompiledRoute {
+    Route route;
+    std::vector<std::string> segments;
+
+    bool Matches(std::vector<std::string> const& inSegments, std::vector<std::string>& outParameters) const {
+        if (inSegments.size() != segments.size())
+            return false;
+        outParameters.clear();
+        for (std::size_t i = 0; i < segments.size(); ++i) {
+            if (segments[i] == "{}")
+                outParameters.push_back(inSegments[i]);
+            else if (segments[i] != inSegments[i])
+                return false;
+        }
+        return true;
+    }
+};
+
+struct Hub::Match {
+    Route const* route = nullptr;
+    std::vector<std::string> parameters;
+};
+
+Hub::Hub(Storage& inStorage, HubSettings inSettings, Clock inClock)
+    : mStorage(inStorage),
+      mSettings(std::move(inSettings)),
+      mClock(std::move(inClock)),
+      mCache(mSettings.documentCacheBytes) {
+    std::vector<Route> routes;
+    AddSystemRoutes(routes);
+    AddProductionRoutes(routes);
+    AddAssetRoutes(routes);
+    AddEnclosureRoutes(routes);
+    AddRenditionRoutes(routes);
+    AddLocatorRoutes(routes);
+    for (auto& route : routes) {
+        CompiledRoute compiled;
+        for (auto segment : Split(route.pattern, '/'))
+            compiled.segments.emplace_back(segment);
+        compiled.route = std::move(route);
+        mRoutes.push_back(std::move(compiled));
+    }
+}
+
+Hub::~Hub() = default;
+
+bool Hub::IsSlow(Request const& inRequest) {
+    return inRequest.method == "POST" && JoinedPath(inRequest) == kLoginSegments;
+}
+
+Hub::Match Hub::FindRoute(Request const& inRequest) const {
+    std::string const method = inRequest.method == "HEAD" ? "GET" : inRequest.method;
+    std::set<std::string> allowed;
+    Match match;
+    for (auto const& compiled : mRoutes) {
+        if (!compiled.Matches(inRequest.segments, match.parameters))
+            continue;
+        if (compiled.route.method == method) {
+            match.route = &compiled.route;
+            return match;
+        }
+        allowed.insert(compiled.route.method);
+    }
+    if (allowed.empty() && JoinedPath(inRequest) != kLoginSegments)
+        throw Failure(404, "no-such-address",
+                      "There is nothing at this address; start from the discovery document.");
+    throw Failure(405, "method-not-allowed",
+                  "The method " + inRequest.method + " has no meaning at this address.");
+}
+
+Response Hub::Handle(Request const& inRequest) {
+    try {
+        Response response = Run(inRequest);
+        if (inRequest.IsRead())
+            FinishRead(inRequest, response);
+        return response;
+    } catch (Failure const& failure) {
+        Response response = ErrorResponse(failure.Status(), failure.Code(), failure.what());
+        if (failure.Status() == 401)
+            response.headers.emplace_back("WWW-Authenticate", "Form realm=\"zohub\"");
+        if (failure.Status() == 503)
+            response.headers.emplace_back("Retry-After", "1");
+        return response;
+    } catch (std::exception const& error) {
+        std::string const reference = RandomHex(6);
+        std::cerr << "zohub: error " + reference + " at " + inRequest.method + " " + JoinedPath(inRequest) +
+                         ": " + error.what() + "\n";
+        return ErrorResponse(
+            500, "internal-error",
+            "The hub failed at this request; its log has the cause under " + reference + ".");
+    }
+}
+
+Response Hub::Run(Request const& inRequest) {
+    if (IsSlow(inRequest))
+        return SignInByForm(inRequest, mStorage, mSettings, mClock());
+    return RunRoute(inRequest, FindRoute(inRequest));
+}
+
+Response Hub::RunRoute(Request const& inRequest, Match const& inMatch) {
+    auto const transaction = inRequest.IsRead() ? mStorage.BeginRead() : mStorage.BeginWrite();
+    Call call{inRequest,    inMatch.parameters,
+              mSettings,    mCache,
+              *transaction, Repository(*transaction),
+              Actor(),      std::string(),
+              mClock(),     inRequest.baseUrl + "/" + kApiPath};
+    Identify(call);
+    if (inMatch.route->signIn == SignIn::Needed && call.actor.name.empty())
+        throw Failure(401, "not-signed-in", "The request has no valid login token; sign in and repeat it.");
+    return inRequest.IsRead() ? inMatch.route->handle(call) : RunMutation(call, *inMatch.route);
+}
+
+Response Hub::RunMutation(Call& ioCall, Route const& inRoute) {
+    std::string const key(ioCall.request.Header("Idempotency-Key"));
+    if (key.size() > kMaxIdempotencyKey)
+        throw Failure(400, "idempotency-key-too-long", "An Idempotency-Key has at most 128 bytes.");
+    if (!key.empty()) {
+        auto const stored = ioCall.transaction.FindAnswer(ioCall.actor.name, key, ioCall.now - kDay);
+        if (stored && stored->fingerprint != Fingerprint(ioCall.request))
+            throw Failure(422, "idempotency-key-reused",
+                          "This Idempotency-Key belongs to another request; use a fresh one.");
+        if (stored)
+            return AnswerOf(*stored);
+    }
+    Response response = inRoute.handle(ioCall);
+    if (!key.empty()) {
+        ioCall.transaction.RemoveAnswersBefore(ioCall.now - kDay);
+        ioCall.transaction.AddAnswer(RecordOf(response, ioCall, key));
+    }
+    ioCall.transaction.Commit();
+    return response;
+}
+
+}  // namespace zohub

@@ -1,0 +1,80 @@
+// The hub's application: storage, clock and caches, and the way of a request through its route.
+#pragma once
+
+#include <functional>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "Base/Clock.h"
+#include "Http/Message.h"
+#include "Model/Repository.h"
+#include "Routes/DocumentCache.h"
+#include "Store/Storage.h"
+
+namespace zohub {
+
+struct HubSettings {
+    std::string id;  ///< of this hub, stable over its life
+    std::string name = "zohub";
+    std::string description = "Development hub";
+    Micros tokenLifetime = kDay;
+    std::size_t documentCacheBytes = 256u << 20;
+};
+
+/// One request on its way through a route, inside its database transaction.
+struct Call {
+    Request const& request;
+    std::vector<std::string> const& parameters;  ///< the {} parts of the route's pattern, in order
+    HubSettings const& settings;
+    DocumentCache& cache;
+    Transaction& transaction;
+    Repository repository;
+    Actor actor;            ///< with an empty name when nobody is signed in
+    std::string tokenHash;  ///< of the token that the request came with
+    Micros now = 0;
+    std::string api;  ///< "http://host:port/content/zo/api/v1"
+
+    /// For documents whose tag is known before they are made: the 304, when the client has them already.
+    bool HasCurrent(std::string const& inETag) const { return IfNoneMatchHits(request, inETag); }
+};
+
+enum class SignIn { Needed, Optional };
+
+struct Route {
+    std::string method;
+    std::string pattern;  ///< "productions/{}/assets"; {} stands for one segment
+    SignIn signIn = SignIn::Needed;
+    std::function<Response(Call&)> handle;
+};
+
+inline constexpr char kApiPath[] = "content/zo/api/v1";
+inline constexpr char kDiscoveryPath[] = "content/zo/api/discovery.json";
+
+/// Thread-safe.
+class Hub {
+public:
+    Hub(Storage& inStorage, HubSettings inSettings, Clock inClock);
+    ~Hub();
+
+    /// Runs the request inside one transaction. What is refused or fails is undone and answered as JSON.
+    Response Handle(Request const& inRequest);
+    /// Sign-ins: slow on purpose.
+    static bool IsSlow(Request const& inRequest);
+
+private:
+    struct Match;
+    Match FindRoute(Request const& inRequest) const;
+    Response Run(Request const& inRequest);
+    Response RunRoute(Request const& inRequest, Match const& inMatch);
+    Response RunMutation(Call& ioCall, Route const& inRoute);
+
+    struct CompiledRoute;
+    Storage& mStorage;
+    HubSettings const mSettings;
+    Clock const mClock;
+    DocumentCache mCache;
+    std::vector<CompiledRoute> mRoutes;
+};
+
+}  // namespace zohub

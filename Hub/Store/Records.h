@@ -1,0 +1,93 @@
+// The rows that the hub keeps, as plain values.
+#pragma once
+
+#include <cstdint>
+#include <string>
+
+#include "Base/Clock.h"
+
+namespace zohub {
+
+struct UserRecord {
+    std::string name;
+    std::string passwordHash;
+    std::string firstName;
+    std::string lastName;
+    std::string email;
+    bool isAdmin = false;
+    Micros created = 0;
+};
+
+/// One sign-in. The token itself is not kept, only its hash.
+struct TokenRecord {
+    std::string tokenHash;
+    std::string user;
+    std::string address;
+    std::string userAgent;
+    Micros created = 0;
+    Micros expires = 0;
+};
+
+/// A line of commits: a shared production or a template, and later a session or a transaction on top of one.
+struct LineRecord {
+    std::string id;
+    std::string kind;
+    std::string parent;      ///< the line below it; empty for productions and templates
+    std::string production;  ///< the production it belongs to; its own id for a production or template
+    std::string owner;
+    std::string baseCommit;  ///< the commit of the parent that it stands on
+    std::string headCommit;
+    std::string metadata;  ///< JSON of the client that made it, or empty
+    bool isTemporary = false;
+    Micros created = 0;
+    Micros modified = 0;
+};
+
+inline constexpr char kLineProduction[] = "production";
+inline constexpr char kLineTemplate[] = "template";
+
+struct CommitRecord {
+    std::string id;
+    std::string production;
+    std::string parent;
+    std::string tree;
+    std::string title;
+    std::string committer;
+    Micros time = 0;
+};
+
+/// Says that a production has, or once had, this content; it is what makes content readable through it.
+struct ReferenceRecord {
+    std::string production;
+    std::string kind;  ///< one of the kReference constants
+    std::string key;   ///< a hash, or the identifier of a media locator
+    std::string item;  ///< identifier of the enclosure or rendition
+    std::string name;
+    std::string type;
+};
+
+inline constexpr char kReferenceAsset[] = "asset";
+inline constexpr char kReferenceEnclosure[] = "enclosure";
+inline constexpr char kReferenceRendition[] = "rendition";
+inline constexpr char kReferenceLocator[] = "locator";
+
+struct LocatorRecord {
+    std::string id;
+    std::string owner;
+    std::string properties;  ///< JSON object as the client sent it
+    Micros created = 0;
+    Micros modified = 0;
+};
+
+/// The answer to a mutating request that carried an idempotency key.
+struct AnswerRecord {
+    std::string user;
+    std::string key;
+    std::string fingerprint;  ///< hash of method, path and body, to notice a key that is used twice
+    int status = 0;
+    std::string headers;  ///< JSON object name to value
+    std::string body;
+    Micros created = 0;
+};
+
+}  // namespace zohub
