@@ -1,0 +1,174 @@
+// Reading and writing the payload of an enclosure.
+#include "Model/Enclosure.h"
+
+#include "ostcore/utility/StringConversion.h"
+#include "Relations.h"
+
+namespace ZOCL {
+
+using ostcore::threads::ScopedLock;
+
+namespace {
+
+const ImmutableString& EnclosurePart() {
+    static const ImmutableString name(":enclosure");
+    return name;
+}
+
+ostnet::http::Form MakePayloadForm(const shared_ptr<RecycledMemory const>& inPayload) {
+    return {{EnclosurePart(), inPayload ? std::string(inPayload->view()) : std::string()}};
+}
+
+int ResultOfPayloadRequest(int inResult, const shared_ptr<ostnet::Response>& inResponse) {
+    if (inResult < 0 || (inResponse && inResponse->IsSuccess())) {
+        return inResult;
+    }
+    return GetResultFromResponse(inResponse, kResultNoResponseObject);
+}
+
+}  // namespace
+
+UString Enclosure::GetEnclosurePayloadAsText() {
+    return ostcore::utility::ToUTF16(GetEnclosurePayloadAsUTF8());
+}
+
+std::string Enclosure::GetEnclosurePayloadAsUTF8() {
+    const auto payload = GetEnclosurePayload();
+    return payload ? std::string(payload->view()) : std::string();
+}
+
+Enclosure::PayloadSource Enclosure::FindPayload(const char* inLabel) {
+    PayloadSource source;
+    dto::Enclosure body;
+    {
+        ScopedLock lock(IZOCDataServer::GetLock(), inLabel);
+        source.held = mPayload;
+        source.link = LinkHrefLocked(kRelation_Enclosures_Enclosure);
+        body = mBody;
+    }
+    source.contentID = body.ContentID();
+    return source;
+}
+
+void Enclosure::KeepPayload(const shared_ptr<RecycledMemory const>& inPayload, const char* inLabel) {
+    shared_ptr<RecycledMemory const> replaced = inPayload;
+    ScopedLock lock(IZOCDataServer::GetLock(), inLabel);
+    mPayload.swap(replaced);
+}
+
+void Enclosure::DropPayload(const shared_ptr<RecycledMemory const>& inPayload, const char* inLabel) {
+    ScopedLock lock(IZOCDataServer::GetLock(), inLabel);
+    if (mPayload == inPayload) {
+        mPayload.reset();
+    }
+}
+
+bool Enclosure::LoadEnclosureData(const Guid& inRequestID, const RequestCompletion& inCompletion) {
+    const PayloadSource source = FindPayload("Enclosure::LoadEnclosureData");
+    if (source.held) {
+        if (inCompletion) {
+            inCompletion(inRequestID, kResultSuccess, GetSelf(), nullptr);
+        }
+        return true;
+    }
+    if (source.link.empty()) {
+        return false;
+    }
+    const InterfaceRef<Enclosure> self(this);
+    const RequestCompletion onPayload = [self, inCompletion](
+                                            const Guid& inID, int inResult,
+                                            const InterfaceRef<IZOCServerResource>& inResource,
+                                            const shared_ptr<ostnet::Response>& inResponse) {
+        const int result = ResultOfPayloadRequest(inResult, inResponse);
+        if (result >= 0 && inResponse) {
+            self->KeepPayload(inResponse->payload, "Enclosure::OnGetEnclosurePayloadCompleted");
+        }
+        if (inCompletion) {
+            inCompletion(inID, result, inResource, inResponse);
+        }
+    };
+    return GetServer()->GETByContentID(source.contentID, inRequestID,
+                                       MakeCompletionFunction(onPayload, false, true), source.link);
+}
+
+bool Enclosure::EnclosureDataIsLoaded() {
+    ScopedLock lock(IZOCDataServer::GetLock(), "Enclosure::EnclosureDataIsLoaded");
+    return mPayload != nullptr;
+}
+
+shared_ptr<RecycledMemory const> Enclosure::GetEnclosurePayload() {
+    const PayloadSource source = FindPayload("Enclosure::GetEnclosurePayload (1)");
+    if (source.held || source.link.empty()) {
+        return source.held;
+    }
+    const auto response =
+        GetServer()->BlockingGETByContentID(source.contentID, source.link, ostnet::http::kWaitForever);
+    if (!response || !response->IsSuccess()) {
+        return nullptr;
+    }
+    ScopedLock lock(IZOCDataServer::GetLock(), "Enclosure::GetEnclosurePayload (2)");
+    if (!mPayload) {
+        mPayload = response->payload;
+    }
+    return mPayload;
+}
+
+ImmutableString Enclosure::GetEnclosureContentID() {
+    return GetBody("Enclosure::GetEnclosureContentID").ContentID();
+}
+
+ImmutableString Enclosure::GetEnclosureName() {
+    return GetBody("Enclosure::GetEnclosureName").Name();
+}
+
+ImmutableString Enclosure::GetEnclosureID() {
+    return GetBody("Enclosure::GetEnclosureID").Identifier();
+}
+
+std::string Enclosure::GetTraceName() {
+    return GetEnclosureName().str();
+}
+
+bool Enclosure::PutEnclosurePayload(const shared_ptr<RecycledMemory const>& inPayload,
+                                    const Guid& inRequestID, const RequestCompletion& inCompletion) {
+    const ImmutableString target = GetLinkHref(kRelation_Edit);
+    if (target.empty()) {
+        return false;
+    }
+    KeepPayload(inPayload, "Enclosure::PutEnclosurePayload");
+    const InterfaceRef<Enclosure> self(this);
+    const RequestCompletion onPut = [self, inPayload, inCompletion](
+                                        const Guid& inID, int inResult,
+                                        const InterfaceRef<IZOCServerResource>&,
+                                        const shared_ptr<ostnet::Response>& inResponse) {
+        const int result = ResultOfPayloadRequest(inResult, inResponse);
+        if (result < 0) {
+            self->DropPayload(inPayload, "Enclosure::OnPutEnclosurePayloadCompleted");
+        }
+        if (inCompletion) {
+            inCompletion(inID, result, self, inResponse);
+        }
+    };
+    const auto resource = ServerResource::MakePlain(target, GetServer(), ResourceWritability::kReadOnly);
+    const bool started = resource->PutMultiPart(MakePayloadForm(inPayload), inRequestID, onPut);
+    if (!started) {
+        DropPayload(inPayload, "Enclosure::PutEnclosurePayload");
+    }
+    return started;
+}
+
+bool Enclosure::PutEnclosurePayload(const shared_ptr<RecycledMemory const>& inPayload) {
+    const ImmutableString target = GetLinkHref(kRelation_Edit);
+    if (target.empty()) {
+        return false;
+    }
+    const auto resource = ServerResource::MakePlain(target, GetServer(), ResourceWritability::kReadOnly);
+    const auto response = resource->PutMultiPart(MakePayloadForm(inPayload));
+    if (!response || !response->IsSuccess()) {
+        return false;
+    }
+    KeepPayload(inPayload, "Enclosure::PutEnclosurePayload (Synchronous)");
+    return true;
+}
+
+}  // namespace ZOCL
