@@ -1,0 +1,203 @@
+// Parking, renewal and replay; the verbs stand in AuthorizationVerbs.cpp.
+#include "RequestChain/AuthorizationProcessor.h"
+
+namespace ZOCL {
+
+using ostcore::threads::ScopedLock;
+using ostnet::Response;
+
+namespace {
+
+constexpr std::int32_t kStatusUnauthorized = 401;
+
+}  // namespace
+
+AuthorizationProcessor::AuthorizationProcessor(shared_ptr<ostnet::http::RequestProcessor> inNext,
+                                               function<void()> inTokenNotification)
+    : ForwardingProcessor(std::move(inNext)), mTokenNotification(std::move(inTokenNotification)) {}
+
+bool AuthorizationProcessor::MakeRequest(const Guid& inRequestID, PackedRequest inPacked,
+                                         const CompletionFunction& inCompletion) {
+    ImmutableString token;
+    {
+        ScopedLock lock(mMutex, "AuthorizationProcessor::MakeRequest");
+        token = mToken;
+    }
+    return SendWithToken(Request{std::move(inPacked), inCompletion, inRequestID}, token);
+}
+
+bool AuthorizationProcessor::SendWithToken(const Request& inRequest, const ImmutableString& inToken) {
+    return inRequest.makeRequest(inToken, [self = shared_from_this(), inRequest, inToken](
+                                              const Guid& inID, const shared_ptr<Response>& inResponse) {
+        self->OnCompleted(inRequest, inToken, inID, inResponse);
+    });
+}
+
+void AuthorizationProcessor::OnCompleted(const Request& inRequest, const ImmutableString& inUsedToken,
+                                         const Guid& inRequestID, const shared_ptr<Response>& inResponse) {
+    if (!inResponse || inResponse->status != kStatusUnauthorized) {
+        inRequest.completion(inRequestID, inResponse);
+        return;
+    }
+    enum class Verdict { kGiveBack, kSendAgain, kParked } verdict = Verdict::kParked;
+    ImmutableString current;
+    function<void()> notification;
+    {
+        ScopedLock lock(mMutex, "AuthorizationProcessor::CompletionFunction");
+        current = mToken;
+        if (mToken.IsNull() || !mTokenNotification || inRequest.renewals >= kMaximumRenewals) {
+            verdict = Verdict::kGiveBack;
+        } else if (inUsedToken != mToken) {
+            verdict = Verdict::kSendAgain;
+            mInTransit.emplace(inRequest.requestID, false);
+        } else {
+            if (mState == State::kTokenHeld) {
+                notification = mTokenNotification;
+            }
+            mState = State::kTokenAskedFor;
+            mParked.push_back({inRequest, inUsedToken, inResponse});
+            ++mParked.back().request.renewals;
+        }
+    }
+    switch (verdict) {
+        case Verdict::kGiveBack:
+            inRequest.completion(inRequestID, inResponse);
+            break;
+        case Verdict::kSendAgain:
+            SendAgain({inRequest, inUsedToken, inResponse}, current);
+            break;
+        case Verdict::kParked:
+            if (notification) {
+                notification();
+            }
+            break;
+    }
+}
+
+void AuthorizationProcessor::SetAuthToken(const ImmutableString& inToken) {
+    std::vector<ParkedRequest> parked;
+    {
+        ScopedLock lock(mMutex, "AuthorizationProcessor::SetAuthTokenNotificationFunction");
+        parked.swap(mParked);
+        mState = inToken.IsNull() ? State::kNoToken : State::kTokenHeld;
+        mToken = inToken;
+        for (const ParkedRequest& entry : parked) {
+            mInTransit.emplace(entry.request.requestID, false);
+        }
+    }
+    std::vector<Ending> endings;
+    for (const ParkedRequest& entry : parked) {
+        if (!inToken.IsNull() && inToken != entry.token) {
+            SendAgain(entry, inToken);
+        } else if (TakeCancelInTransit(entry.request.requestID)) {
+            EndCancelled(entry.request);
+        } else {
+            endings.push_back({entry.request.completion, entry.request.requestID, entry.response});
+        }
+    }
+    EndLater(std::move(endings));
+}
+
+void AuthorizationProcessor::SetAuthTokenNotificationFunction(const function<void()>& inFunction) {
+    function<void()> former = inFunction;
+    ScopedLock lock(mMutex, "AuthorizationProcessor::SetAuthTokenNotificationFunction");
+    former.swap(mTokenNotification);
+    lock.Unlock();
+}
+
+void AuthorizationProcessor::ClearAuthTokenNotificationFunction() {
+    function<void()> former;
+    bool wasAskedFor = false;
+    {
+        ScopedLock lock(mMutex, "AuthorizationProcessor::ClearAuthTokenNotificationFunction");
+        former.swap(mTokenNotification);
+        wasAskedFor = mState == State::kTokenAskedFor;
+    }
+    if (wasAskedFor) {
+        SetAuthToken(ImmutableString());
+    }
+}
+
+void AuthorizationProcessor::TryToCancelRequest(const Guid& inRequestID) {
+    optional<ParkedRequest> parked;
+    {
+        ScopedLock lock(mMutex, "AuthorizationProcessor::TryToCancelRequest");
+        const auto inTransit = mInTransit.find(inRequestID);
+        if (inTransit != mInTransit.end()) {
+            inTransit->second = true;
+            return;
+        }
+        const auto found = std::find_if(mParked.begin(), mParked.end(), [&](const ParkedRequest& inParked) {
+            return inParked.request.requestID == inRequestID;
+        });
+        if (found != mParked.end()) {
+            parked = std::move(*found);
+            mParked.erase(found);
+        }
+    }
+    if (parked) {
+        EndCancelled(parked->request);
+    } else {
+        Next()->TryToCancelRequest(inRequestID);
+    }
+}
+
+void AuthorizationProcessor::SendAgain(const ParkedRequest& inParked, const ImmutableString& inToken) {
+    const Guid& requestID = inParked.request.requestID;
+    bool isCancelled = false;
+    {
+        ScopedLock lock(mMutex, "AuthorizationProcessor::SendAgain");
+        const auto found = mInTransit.find(requestID);
+        isCancelled = found != mInTransit.end() && found->second;
+        if (isCancelled) {
+            mInTransit.erase(found);
+        }
+    }
+    if (isCancelled) {
+        EndCancelled(inParked.request);
+        return;
+    }
+    const bool started = SendWithToken(inParked.request, inToken);
+    const bool wasCancelledMeanwhile = TakeCancelInTransit(requestID);
+    if (!started) {
+        EndWithRefusal(inParked);
+    } else if (wasCancelledMeanwhile) {
+        Next()->TryToCancelRequest(requestID);
+    }
+}
+
+bool AuthorizationProcessor::TakeCancelInTransit(const Guid& inRequestID) {
+    ScopedLock lock(mMutex, "AuthorizationProcessor::TakeCancelInTransit");
+    const auto found = mInTransit.find(inRequestID);
+    if (found == mInTransit.end()) {
+        return false;
+    }
+    const bool isCancelled = found->second;
+    mInTransit.erase(found);
+    return isCancelled;
+}
+
+void AuthorizationProcessor::EndLater(std::vector<Ending> inEndings) {
+    if (inEndings.empty()) {
+        return;
+    }
+    const auto endAll = [endings = std::move(inEndings)] {
+        for (const Ending& ending : endings) {
+            ending.completion(ending.requestID, ending.response);
+        }
+    };
+    if (!PostFunction(endAll, 0)) {
+        endAll();
+    }
+}
+
+void AuthorizationProcessor::EndWithRefusal(const ParkedRequest& inParked) {
+    EndLater({Ending{inParked.request.completion, inParked.request.requestID, inParked.response}});
+}
+
+void AuthorizationProcessor::EndCancelled(const Request& inRequest) {
+    EndLater({Ending{inRequest.completion, inRequest.requestID,
+                     boost::make_shared<Response>(Response::kStatusCancelled)}});
+}
+
+}  // namespace ZOCL

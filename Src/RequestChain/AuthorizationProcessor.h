@@ -1,0 +1,126 @@
+// Puts the login token on every request, and sees a request through the expiry of its token.
+#pragma once
+
+#include <map>
+#include <vector>
+
+#include "ostcore/threads/RecursiveMutex.h"
+#include "ostnet/http/RequestProcessor.h"
+#include "ZOClient/Types.h"
+
+namespace ZOCL {
+
+/// A request that comes back with status 401 is parked, a new token is asked for once, and when it comes all
+/// parked requests are sent again with it.
+///
+/// The race: many requests are refused with the same token at once, and while a new token is fetched more
+/// are refused, some with the old token, some were sent already with the new one. The lock alone does not
+/// decide what a late 401 means; so each request remembers the token that it carried. A refused token that
+/// is not the current one means that the request merely left too early: it is sent again at once. Only the
+/// first refusal of the current token moves the state from kTokenHeld to kTokenAskedFor and asks; all
+/// others find the state moved. Hence one question for any number of refusals.
+///
+/// Invariants: a request is in the hands of the next layer, parked, or in transit (taken out to be sent
+/// again) and in one of these only, so it completes once. The mutex is never held over the next layer, a
+/// completion or the notification.
+///
+/// Threads: any. Completions that this layer itself makes (a cancel, a refusal at the end) run on the workers
+/// of the base processor, never on the stack of the operation that caused them.
+class AuthorizationProcessor : public ostnet::http::ForwardingProcessor,
+                               public boost::enable_shared_from_this<AuthorizationProcessor> {
+public:
+    using CompletionFunction = ostnet::http::CompletionFunction;
+    using RequestOptions = ostnet::http::RequestOptions;
+    using Headers = ostnet::Headers;
+    using Form = ostnet::http::Form;
+    using Payload = shared_ptr<RecycledMemory const>;
+
+    /// How often one request waits for a new token before its 401 goes to the caller: a server that accepts
+    /// each login and refuses each token does not keep it for ever.
+    static constexpr int kMaximumRenewals = 4;
+
+    AuthorizationProcessor(shared_ptr<ostnet::http::RequestProcessor> inNext,
+                           function<void()> inTokenNotification);
+
+    void TryToCancelRequest(const Guid& inRequestID) override;
+    bool GET(const Guid&, const CompletionFunction&, const ImmutableString&, Headers,
+             const RequestOptions&) override;
+    bool HEAD(const Guid&, const CompletionFunction&, const ImmutableString&, Headers,
+              const RequestOptions&) override;
+    bool PUT(const Guid&, const CompletionFunction&, const ImmutableString&, Headers, const Payload&,
+             const RequestOptions&) override;
+    bool PUT(const Guid&, const CompletionFunction&, const ImmutableString&, Headers, const Form&,
+             const RequestOptions&) override;
+    bool POST(const Guid&, const CompletionFunction&, const ImmutableString&, Headers, const Payload&,
+              const RequestOptions&) override;
+    bool POST(const Guid&, const CompletionFunction&, const ImmutableString&, Headers, const Form&,
+              const RequestOptions&) override;
+    bool DELETE(const Guid&, const CompletionFunction&, const ImmutableString&, Headers,
+                const RequestOptions&) override;
+
+    virtual void AddAuthorizationHeaders(const ImmutableString& inToken, Headers& ioHeaders);
+    virtual bool SendGET(const ImmutableString& inToken, const Guid&, const CompletionFunction&,
+                         const ImmutableString&, Headers, const RequestOptions&);
+    virtual bool SendHEAD(const ImmutableString& inToken, const Guid&, const CompletionFunction&,
+                          const ImmutableString&, Headers, const RequestOptions&);
+    virtual bool SendPUT(const ImmutableString& inToken, const Guid&, const CompletionFunction&,
+                         const ImmutableString&, Headers, const Payload&, const RequestOptions&);
+    virtual bool SendPUT(const ImmutableString& inToken, const Guid&, const CompletionFunction&,
+                         const ImmutableString&, Headers, const Form&, const RequestOptions&);
+    virtual bool SendPOST(const ImmutableString& inToken, const Guid&, const CompletionFunction&,
+                          const ImmutableString&, Headers, const Payload&, const RequestOptions&);
+    virtual bool SendPOST(const ImmutableString& inToken, const Guid&, const CompletionFunction&,
+                          const ImmutableString&, Headers, const Form&, const RequestOptions&);
+    virtual bool SendDELETE(const ImmutableString& inToken, const Guid&, const CompletionFunction&,
+                            const ImmutableString&, Headers, const RequestOptions&);
+
+    /// A token sends the parked requests again; the null token, or the one that they were refused with, ends
+    /// them with their 401.
+    void SetAuthToken(const ImmutableString& inToken);
+    void SetAuthTokenNotificationFunction(const function<void()>& inFunction);
+    /// From now on nobody is asked for a token; if somebody was, the parked requests end with their 401.
+    void ClearAuthTokenNotificationFunction();
+
+private:
+    /// The request as a whole, to be sent with a token as often as needed.
+    using PackedRequest =
+        function<bool(const ImmutableString& inToken, const CompletionFunction& inCompletion)>;
+    enum class State { kNoToken, kTokenHeld, kTokenAskedFor };
+    struct Request {
+        PackedRequest makeRequest;
+        CompletionFunction completion;
+        Guid requestID;
+        int renewals = 0;
+    };
+    struct ParkedRequest {
+        Request request;
+        ImmutableString token;
+        shared_ptr<ostnet::Response> response;
+    };
+    struct Ending {
+        CompletionFunction completion;
+        Guid requestID;
+        shared_ptr<ostnet::Response> response;
+    };
+
+    bool MakeRequest(const Guid& inRequestID, PackedRequest inPacked, const CompletionFunction& inCompletion);
+    bool SendWithToken(const Request& inRequest, const ImmutableString& inToken);
+    void OnCompleted(const Request& inRequest, const ImmutableString& inUsedToken, const Guid& inRequestID,
+                     const shared_ptr<ostnet::Response>& inResponse);
+    /// Sends a request in transit again; cancels that came meanwhile are honoured.
+    void SendAgain(const ParkedRequest& inParked, const ImmutableString& inToken);
+    bool TakeCancelInTransit(const Guid& inRequestID);
+    void EndLater(std::vector<Ending> inEndings);
+    void EndWithRefusal(const ParkedRequest& inParked);
+    void EndCancelled(const Request& inRequest);
+
+    mutable ostcore::threads::RecursiveMutex mMutex;
+    State mState ZO_GUARDED_BY(mMutex) = State::kNoToken;
+    std::vector<ParkedRequest> mParked ZO_GUARDED_BY(mMutex);
+    /// Requests that are being sent again, each with whether it was cancelled meanwhile.
+    std::map<Guid, bool> mInTransit ZO_GUARDED_BY(mMutex);
+    ImmutableString mToken ZO_GUARDED_BY(mMutex);
+    function<void()> mTokenNotification ZO_GUARDED_BY(mMutex);
+};
+
+}  // namespace ZOCL
