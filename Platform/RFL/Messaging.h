@@ -58,9 +58,9 @@ public:
     /// been delivered, so the caller must hold no lock that a listener could want, and the main thread must
     /// be running its queue.
     ///
-    /// Returns false when there was nothing to deliver (a null message). A handler that throws is traced and
-    /// does not keep the message from the others.
-    /// Threads: any.
+    /// Returns false when the message will not be delivered: it is null, or the main thread's queue was
+    /// dropped while the call waited. A handler that throws is traced and does not keep the message from the
+    /// others. Threads: any.
     static bool PostMessageToUIThread(const ImmutableString& inStation, shared_ptr<Message const> inMessage,
                                       bool inSynchronous);
 
@@ -105,6 +105,7 @@ public:
 private:
     HandlerID AddRawHandler(MessageID inType, function<void(const Message&)> inHandler);
 
+    friend class MessageDelivery;
     struct State;
     shared_ptr<State> mState;
 };

@@ -76,7 +76,8 @@ public:
     InterfaceRef(const InterfaceRef& inOther) noexcept : mPointer(inOther.mPointer) { Retain(); }
     InterfaceRef(InterfaceRef&& inOther) noexcept : mPointer(std::exchange(inOther.mPointer, nullptr)) {}
     /// Up the inheritance of interfaces, without a query.
-    template <class U, class = std::enable_if_t<std::is_convertible<U*, T*>::value && !std::is_same<U, T>::value>>
+    template <class U,
+              class = std::enable_if_t<std::is_convertible<U*, T*>::value && !std::is_same<U, T>::value>>
     InterfaceRef(const InterfaceRef<U>& inOther) noexcept : mPointer(inOther.GetUnchecked()) {
         Retain();
     }

@@ -1,0 +1,30 @@
+// Where registry files lie and with which modes they are made.
+#pragma once
+
+#include <cstdint>
+#include <string>
+
+#include "RFL/Registry.h"
+
+namespace RFL {
+
+struct RegistryFileIdentity {
+    std::uint64_t device = 0;
+    std::uint64_t inode = 0;
+};
+
+/// Makes the directory (0700 for the user, 0755 for the machine) and an empty file (0600, 0644) unless they
+/// are there, whatever the umask says. A user's file with a wider mode is narrowed to 0600.
+int CreateRegistryFile(RegistryRoot inRoot, const std::string& inFile);
+
+/// Makes sure that a path names a regular file and no link, and gives the path with its directory resolved.
+int ResolveRegistryFile(const std::string& inFile, std::string& outFile, RegistryFileIdentity& outIdentity);
+
+std::string RegistryDirectory(const std::string& inFile);
+/// Makes the directory of a registry file and its missing parents, private to the user where it is his.
+bool MakeRegistryDirectory(RegistryRoot inRoot, const std::string& inFile);
+
+/// False when there is no regular file.
+bool IdentifyRegistryFile(const std::string& inFile, RegistryFileIdentity& outIdentity);
+
+}  // namespace RFL
