@@ -161,6 +161,9 @@ void Exchange::Attach(CURL* inHandle, Clock::time_point inNow) {
 
 CURL* Exchange::Detach(CURLcode inResult) {
     mResult = mRefusal != CURLE_OK ? mRefusal : inResult;
+    if (mResult == CURLE_OK && !mHeadDone) {
+        mResult = CURLE_GOT_NOTHING;  // closed within the head, which the engine takes for its end
+    }
     mStatus = static_cast<std::int32_t>(GetLong(mHandle, CURLINFO_RESPONSE_CODE));
     mBytesSent = GetOffset(mHandle, CURLINFO_SIZE_UPLOAD_T);
     mConnectionsOpened = static_cast<std::uint64_t>(GetLong(mHandle, CURLINFO_NUM_CONNECTS));
