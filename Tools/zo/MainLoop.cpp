@@ -1,0 +1,117 @@
+// Brings completions to the main thread and waits for them.
+#include "MainLoop.h"
+
+#include <memory>
+
+#include "Failure.h"
+#include "ostcore/threads/MainThread.h"
+
+namespace zo {
+namespace {
+
+constexpr std::uint32_t kForEver = 0xFFFFFFFFu;
+
+}  // namespace
+
+void MainLoop::Start(const StartFunction& inStart, const CancelFunction& inCancel, OutcomeFunction inDone) {
+    if (mInterrupt.IsRequested()) {
+        Outcome cancelled;
+        cancelled.started = true;
+        cancelled.result = ZOCL::kResultCancelled;
+        inDone(cancelled);
+        return;
+    }
+    const ZOCL::Guid request = ZOCL::Guid::CreateUnique();
+    const std::size_t call = Add(request, inCancel);
+    const auto done = std::make_shared<OutcomeFunction>(std::move(inDone));
+    const auto onCompleted = [this, call, done](
+                                 const ZOCL::Guid&, int inResult,
+                                 const ZOCL::InterfaceRef<ZOCL::IZOCServerResource>& inResource,
+                                 const boost::shared_ptr<ostnet::Response>& inResponse) {
+        const Outcome outcome{true, inResult, inResponse, inResource};
+        ostcore::threads::AsyncCallFromMainThread([this, call, done, outcome] {
+            mInFlight.erase(call);
+            (*done)(outcome);
+        });
+    };
+    if (!inStart(request, onCompleted)) {
+        mInFlight.erase(call);
+        (*done)(Outcome{});
+    }
+}
+
+void MainLoop::Wait() {
+    PumpUntilIdle();
+    ThrowIfInterrupted();
+}
+
+Outcome MainLoop::Run(const StartFunction& inStart, const CancelFunction& inCancel) {
+    Outcome outcome;
+    Start(inStart, inCancel, [&outcome](const Outcome& inOutcome) { outcome = inOutcome; });
+    Wait();
+    return outcome;
+}
+
+MainLoop::ConnectOutcome MainLoop::Connect(const ConnectStart& inStart) {
+    ThrowIfInterrupted();
+    const auto outcome = std::make_shared<ConnectOutcome>();
+    ZOCL::Guid request;
+    const std::size_t call = Add(
+        request, [](const ZOCL::Guid& inRequest) { ZOCL::IZOCDataServer::CancelConnectRequest(inRequest); });
+    outcome->started = inStart(
+        request,
+        [this, call, outcome](const ZOCL::Guid&, const ZOCL::InterfaceRef<ZOCL::IZOCDataServer>& inServer,
+                              int inResult, const boost::shared_ptr<ostnet::Response>& inResponse) {
+            ostcore::threads::AsyncCallFromMainThread([this, call, outcome, inServer, inResult, inResponse] {
+                outcome->result = inResult;
+                outcome->server = inServer;
+                outcome->response = inResponse;
+                mInFlight.erase(call);
+            });
+        });
+    if (!outcome->started) {
+        mInFlight.erase(call);
+        return *outcome;
+    }
+    // The completion only queues, so the entry is still there although the identifier comes late.
+    mInFlight.at(call).request = request;
+    Wait();
+    return *outcome;
+}
+
+void MainLoop::ThrowIfInterrupted() const {
+    if (mInterrupt.IsRequested()) {
+        throw Failure(ExitCode::Cancelled, "cancelled");
+    }
+}
+
+void MainLoop::Drain() {
+    if (!mInFlight.empty()) {
+        CancelAll();
+        PumpUntilIdle();
+    }
+}
+
+std::size_t MainLoop::Add(const ZOCL::Guid& inRequest, const CancelFunction& inCancel) {
+    mInFlight[++mLastCall] = Call{inRequest, inCancel};
+    return mLastCall;
+}
+
+void MainLoop::CancelAll() {
+    mCancelled = true;
+    const std::map<std::size_t, Call> inFlight = mInFlight;
+    for (const auto& [call, entry] : inFlight) {
+        entry.cancel(entry.request);
+    }
+}
+
+void MainLoop::PumpUntilIdle() {
+    while (!mInFlight.empty()) {
+        if (mInterrupt.IsRequested() && !mCancelled) {
+            CancelAll();
+        }
+        ostcore::threads::WaitAndPumpMainThread(kForEver);
+    }
+}
+
+}  // namespace zo

@@ -1,0 +1,74 @@
+// Waits on the main thread for asynchronous calls of the library, and cancels them on Ctrl-C.
+#pragma once
+
+#include <functional>
+#include <map>
+
+#include "Interrupt.h"
+#include "ZOClient/IZOCDataServer.h"
+
+namespace zo {
+
+/// How one asynchronous call ended.
+struct Outcome {
+    /// False when the call could not be started; nothing else counts then.
+    bool started = false;
+    int result = ZOCL::kResultNotStarted;
+    boost::shared_ptr<ostnet::Response> response;
+    ZOCL::InterfaceRef<ZOCL::IZOCServerResource> resource;
+
+    bool Succeeded() const noexcept { return started && result >= 0; }
+};
+
+/// Starts a call with the request identifier and completion that it is given.
+using StartFunction = std::function<bool(const ZOCL::Guid&, const ZOCL::RequestCompletion&)>;
+using CancelFunction = std::function<void(const ZOCL::Guid&)>;
+using OutcomeFunction = std::function<void(const Outcome&)>;
+
+/// The library completes on its own threads; here each completion is handed to the main thread, so that
+/// verbs need no locks. One function waits for everything that was started.
+///
+/// An interrupt cancels all calls in flight, once; they still complete, and Wait returns when they have.
+/// Main thread only.
+class MainLoop {
+public:
+    explicit MainLoop(Interrupt& inInterrupt) : mInterrupt(inInterrupt) {}
+
+    /// Starts a call; inDone runs in Wait, on the main thread. When an interrupt has come nothing is started
+    /// and inDone learns of a cancelled call. inDone must not throw.
+    void Start(const StartFunction& inStart, const CancelFunction& inCancel, OutcomeFunction inDone);
+    /// Returns when nothing is in flight. Throws a Failure (cancelled) after an interrupt.
+    void Wait();
+    /// Starts one call and waits for it and for all others in flight.
+    Outcome Run(const StartFunction& inStart, const CancelFunction& inCancel);
+
+    struct ConnectOutcome {
+        bool started = false;
+        int result = ZOCL::kResultNotStarted;
+        boost::shared_ptr<ostnet::Response> response;
+        ZOCL::InterfaceRef<ZOCL::IZOCDataServer> server;
+    };
+    using ConnectStart = std::function<bool(ZOCL::Guid&, const ZOCL::IZOCDataServer::ConnectCompletion&)>;
+    ConnectOutcome Connect(const ConnectStart& inStart);
+
+    std::size_t InFlight() const noexcept { return mInFlight.size(); }
+    void ThrowIfInterrupted() const;
+    /// Cancels what is in flight and waits for its end. For the way out after a failure.
+    void Drain();
+
+private:
+    struct Call {
+        ZOCL::Guid request;
+        CancelFunction cancel;
+    };
+    std::size_t Add(const ZOCL::Guid& inRequest, const CancelFunction& inCancel);
+    void CancelAll();
+    void PumpUntilIdle();
+
+    Interrupt& mInterrupt;
+    bool mCancelled = false;
+    std::size_t mLastCall = 0;
+    std::map<std::size_t, Call> mInFlight;
+};
+
+}  // namespace zo

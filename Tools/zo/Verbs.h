@@ -1,0 +1,22 @@
+// The verbs, one function each. A verb returns when it is done and throws a Failure when it is not.
+#pragma once
+
+namespace zo {
+
+class Context;
+
+void RunHub(Context& ioContext);
+void RunLogin(Context& ioContext);
+void RunLogout(Context& ioContext);
+void RunWhoAmI(Context& ioContext);
+void RunProductions(Context& ioContext);
+void RunOpen(Context& ioContext);
+void RunShow(Context& ioContext);
+void RunAssets(Context& ioContext);
+void RunGet(Context& ioContext);
+void RunHelp(Context& ioContext);
+void RunVersion(Context& ioContext);
+void RunCompletion(Context& ioContext);
+void RunMan(Context& ioContext);
+
+}  // namespace zo
