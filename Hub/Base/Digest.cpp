@@ -31,6 +31,22 @@ std::string GuidText(std::string const& inHex) {
 
 }  // namespace
 
+std::string NewKey(std::size_t inLength) {
+    return KeyFromText(RandomHex(32), inLength);
+}
+
+std::string KeyFromText(std::string_view inText, std::size_t inLength) {
+    static char const kCharacters[] = "0123456789abcdefghijklmnopqrstuvwxyzABCDEFGHIJKLMNOPQRSTUVWXYZ";
+    unsigned char digest[EVP_MAX_MD_SIZE];
+    unsigned int size = 0;
+    if (EVP_Digest(inText.data(), inText.size(), digest, &size, EVP_sha256(), nullptr) != 1)
+        throw std::runtime_error("SHA-256 is not available");
+    std::string key;
+    for (std::size_t i = 0; i < inLength && i < size; ++i)
+        key += kCharacters[digest[i] % 62];
+    return key;
+}
+
 struct Sha256::State {
     EVP_MD_CTX* context = EVP_MD_CTX_new();
     ~State() { EVP_MD_CTX_free(context); }

@@ -27,6 +27,16 @@ private:
 /// Cryptographically random bytes as lower-case hexadecimal text.
 std::string RandomHex(std::size_t inByteCount);
 
+/// A fresh random identifier of letters and digits; 11 of them are 65 bits, 22 are 130. Lists repeat
+/// identifiers often, so they are short.
+std::string NewKey(std::size_t inLength);
+
+/// The identifier that belongs to a text: the same text gives the same one always.
+std::string KeyFromText(std::string_view inText, std::size_t inLength);
+
+inline constexpr std::size_t kShortKey = 11;
+inline constexpr std::size_t kLongKey = 22;
+
 /// A fresh random GUID in its lower-case text form.
 std::string NewGuid();
 

@@ -47,6 +47,31 @@ std::size_t SequenceLength(std::string_view inText, std::size_t inAt) {
     return overlong || outside ? 0 : length;
 }
 
+void AppendEscaped(std::string& ioTarget, char inCharacter) {
+    static char const kDigits[] = "0123456789abcdef";
+    switch (inCharacter) {
+        case '"':
+            ioTarget += "\\\"";
+            return;
+        case '\\':
+            ioTarget += "\\\\";
+            return;
+        case '\n':
+            ioTarget += "\\n";
+            return;
+        case '\t':
+            ioTarget += "\\t";
+            return;
+        case '\r':
+            ioTarget += "\\r";
+            return;
+        default:
+            ioTarget += "\\u00";
+            ioTarget += kDigits[static_cast<unsigned char>(inCharacter) >> 4];
+            ioTarget += kDigits[inCharacter & 15];
+    }
+}
+
 }  // namespace
 
 std::optional<std::string> PercentDecode(std::string_view inText) {
@@ -136,35 +161,17 @@ std::vector<std::string_view> Split(std::string_view inText, char inSeparator) {
 }
 
 void AppendJsonString(std::string& ioTarget, std::string_view inText) {
-    static char const kDigits[] = "0123456789abcdef";
     ioTarget += '"';
-    for (char c : inText) {
-        switch (c) {
-            case '"':
-                ioTarget += "\\\"";
-                break;
-            case '\\':
-                ioTarget += "\\\\";
-                break;
-            case '\n':
-                ioTarget += "\\n";
-                break;
-            case '\t':
-                ioTarget += "\\t";
-                break;
-            case '\r':
-                ioTarget += "\\r";
-                break;
-            default:
-                if (static_cast<unsigned char>(c) < 0x20) {
-                    ioTarget += "\\u00";
-                    ioTarget += kDigits[static_cast<unsigned char>(c) >> 4];
-                    ioTarget += kDigits[c & 15];
-                } else {
-                    ioTarget += c;
-                }
-        }
+    std::size_t plainFrom = 0;
+    for (std::size_t i = 0; i < inText.size(); ++i) {
+        char const c = inText[i];
+        if (static_cast<unsigned char>(c) >= 0x20 && c != '"' && c != '\\')
+            continue;
+        ioTarget.append(inText, plainFrom, i - plainFrom);
+        AppendEscaped(ioTarget, c);
+        plainFrom = i + 1;
     }
+    ioTarget.append(inText, plainFrom, inText.size() - plainFrom);
     ioTarget += '"';
 }
 

@@ -19,6 +19,7 @@ namespace fs = std::filesystem;
 namespace {
 
 constexpr char kSourceKey[] = "zohub:source";
+constexpr std::size_t kSourceDigits = 24;
 constexpr std::uint64_t kMaxSidecar = 16ull << 20;
 constexpr std::size_t kBatchBytes = 32u << 20;
 constexpr std::size_t kBatchCount = 500;
@@ -120,7 +121,7 @@ private:
         auto const line = FindLineByName(*transaction, Kind(), mRequest.production, mRequest.owner);
         if (!line) {
             mReport.isNewProduction = true;
-            mSeed = NewGuid();
+            mSeed = NewKey(kLongKey);
             return;
         }
         mReport.productionId = line->id;
@@ -146,7 +147,7 @@ private:
 
     std::string Kind() const { return mRequest.isTemplate ? kLineTemplate : kLineProduction; }
     std::string IdFor(std::string_view inWhat, std::string const& inPath) const {
-        return GuidFromText(mSeed + "\n" + std::string(inWhat) + "\n" + inPath);
+        return KeyFromText(mSeed + "\n" + std::string(inWhat) + "\n" + inPath, kLongKey);
     }
     std::string BinId(std::string const& inFolder) const {
         return inFolder.empty() ? std::string() : IdFor("bin", inFolder);
@@ -187,9 +188,10 @@ private:
             if (!sidecar)
                 mReport.notes.push_back(inFile.sidecar + " cannot be read or is too large");
         }
-        Json const source = {{"path", inFile.path},
-                             {"media", *fingerprint},
-                             {"sidecar", sidecar ? Sha256Hex(*sidecar) : std::string()}};
+        Json const source = {
+            {"path", inFile.path},
+            {"media", fingerprint->substr(0, kSourceDigits)},
+            {"sidecar", sidecar ? Sha256Hex(*sidecar).substr(0, kSourceDigits) : std::string()}};
         AssetState asset;
         auto const present = mPresent.find(IdFor("asset", inFile.path));
         bool const isNew = present == mPresent.end();
@@ -208,7 +210,7 @@ private:
         std::string const oldLocator = asset.locator;
         Json const old = before.is_object() ? before : Json::object();
         SetProperties(asset, inFile, *fingerprint, source, isNew);
-        if (StringUnder(old, "media") != *fingerprint)
+        if (StringUnder(old, "media") != source["media"].get<std::string>())
             SetRendition(asset, inFile);
         SetSidecar(asset, oldLocator, sidecar,
                    StringUnder(old, "sidecar") != source["sidecar"].get<std::string>());
@@ -219,7 +221,7 @@ private:
     void SetProperties(AssetState& ioAsset, MediaFile const& inFile, std::string const& inFingerprint,
                        Json const& inSource, bool inIsNew) {
         LocatorRecord locator;
-        std::string const documentId = IdFor("document", inFile.path);
+        std::string const documentId = GuidFromText(mSeed + "\n" + inFile.path);
         std::string const contentStateId = GuidFromText(inFingerprint);
         locator.id = documentId + "-" + contentStateId;
         Json const locatorProperties = {
@@ -263,7 +265,7 @@ private:
             if (other.type == inFile.renditionType)
                 rendition = &other;
         if (!rendition) {
-            ioAsset.renditions.push_back({NewGuid(), inFile.renditionType, "", 0});
+            ioAsset.renditions.push_back({NewKey(kShortKey), inFile.renditionType, "", 0});
             rendition = &ioAsset.renditions.back();
         }
         rendition->size = bytes->size();
@@ -282,7 +284,7 @@ private:
         if (!ioSidecar || !inIsNews)
             return;
         if (!enclosure) {
-            ioAsset.enclosures.push_back({NewGuid(), ioAsset.locator + "_xmp", kXmpType, "", 0});
+            ioAsset.enclosures.push_back({NewKey(kShortKey), ioAsset.locator + "_xmp", kXmpType, "", 0});
             enclosure = &ioAsset.enclosures.back();
         }
         enclosure->size = ioSidecar->size();
@@ -306,8 +308,10 @@ private:
         View view = repository.Open(mReport.productionId, "", owner);
         if (!mReport.isNewProduction && view.commit.id != mHead)
             throw std::runtime_error("the production was changed during the import; start it again");
+        // A locator of the same file may belong to somebody already whose production this one is a copy of.
         for (auto const& locator : mLocators)
-            transaction->PutLocator(locator);
+            if (!transaction->FindLocator(locator.id))
+                transaction->PutLocator(locator);
         Repository::Edit edit;
         for (auto const& state : mStates)
             edit.assets[state.id] = repository.AddAsset(view.line.production, state);

@@ -126,7 +126,7 @@ LineRecord Repository::CreateLine(std::string const& inKind, TreeRoot const& inT
                                   std::string const& inTitle, Actor const& inOwner, bool inIsTemporary,
                                   Micros inNow) {
     LineRecord line;
-    line.id = NewGuid();
+    line.id = NewKey(kShortKey);
     line.kind = inKind;
     line.production = line.id;
     line.owner = inOwner.name;

@@ -9,7 +9,7 @@ namespace zohub {
 
 namespace {
 
-constexpr std::size_t kBytesPerAsset = 1300;
+constexpr std::size_t kBytesPerAsset = 3400;
 
 Response AssetResponse(Call& ioCall, View const& inView, AssetState const& inAsset, std::string const& inHash,
                        int inStatus) {
@@ -24,14 +24,14 @@ Response AssetResponse(Call& ioCall, View const& inView, AssetState const& inAss
 }
 
 void AppendListLinks(std::string& ioTarget, DocumentWriter const& inWriter, std::string const& inTail) {
-    ioTarget += "],\"links\":";
+    ioTarget += ",\"links\":";
     LinkWriter links(ioTarget);
     links.Plain("self", inWriter.Prefix() + inTail);
     links.Plain("latest-version", inWriter.LivePrefix() + inTail);
     links.Plain("up", inWriter.Prefix());
-    links.Named("/assets/asset#byId", inWriter.LivePrefix() + "/commits/{commitId}/assets/{assetId}");
+    links.Named("/assets/asset#byId", inWriter.LivePrefix() + "/at/{commitId}/a/{assetId}");
     if (inWriter.IsWritable()) {
-        links.Plain("create", inWriter.LivePrefix() + "/assets");
+        links.Plain("create", inWriter.LivePrefix() + "/a");
         links.Named("/assets#restore", inWriter.LivePrefix() + "/restore/{assetContentId}");
     }
 }
@@ -39,21 +39,21 @@ void AppendListLinks(std::string& ioTarget, DocumentWriter const& inWriter, std:
 std::string WriteList(Call& ioCall, View const& inView, bool inIsFull, std::string const& inTail,
                       std::string const* inParent) {
     DocumentWriter const writer(ioCall.api, inView);
-    std::string items;
-    items.reserve(inView.tree.assetCount * kBytesPerAsset);
+    std::string text;
+    if (!inParent)
+        text.reserve(inView.tree.assetCount * (inIsFull ? kBytesPerAsset : kBytesPerAsset / 2) +
+                     kBytesPerAsset);
+    text = "{\"assets\":[";
     std::size_t count = 0;
     for (auto const& [id, hash] : AssetMap(ioCall.transaction, inView.tree.assets).All()) {
         AssetState const asset = ioCall.repository.LoadAsset(hash);
         if (inParent && asset.parent != *inParent)
             continue;
         if (count++ != 0)
-            items += ',';
-        writer.AppendAsset(items, asset, hash, inIsFull);
+            text += ',';
+        writer.AppendAsset(text, asset, hash, inIsFull);
     }
-    std::string text = "{\"stats\":{\"totalResults\":" + std::to_string(count) + "},\"assets\":[";
-    if (text.size() + items.size() + 1024 > items.capacity())
-        items.reserve(items.size() + 2048);
-    text = items.insert(0, text);
+    text += "],\"stats\":{\"totalResults\":" + std::to_string(count) + "}";
     AppendListLinks(text, writer, inTail);
     text += '}';
     return text;
@@ -64,7 +64,7 @@ Response ListAssets(Call& ioCall, bool inIsPinned, bool inIsFull) {
     DocumentWriter const writer(ioCall.api, view);
     auto const asked = ioCall.request.query.find("parentId");
     std::string const* const parent = asked == ioCall.request.query.end() ? nullptr : &asked->second;
-    std::string tail = inIsFull ? "/assets-full" : "/assets";
+    std::string tail = inIsFull ? "/full" : "/a";
     if (parent)
         tail += "?parentId=" + PercentEncode(*parent);
 
@@ -113,7 +113,7 @@ Response CreateAsset(Call& ioCall) {
     AssetState asset;
     asset.id = StringUnder(body, "zo:assetId");
     if (asset.id.empty())
-        asset.id = NewGuid();
+        asset.id = NewKey(kLongKey);
     if (!IsIdentifier(asset.id))
         throw Failure(400, "identifier-invalid",
                       "\"zo:assetId\" is not an identifier; leave it out to get one.");
@@ -166,19 +166,19 @@ Response RestoreAsset(Call& ioCall) {
 }  // namespace
 
 void AddAssetRoutes(std::vector<Route>& ioRoutes) {
-    std::string const live = std::string(kApiPath) + "/productions/{}";
+    std::string const live = std::string(kApiPath) + "/p/{}";
     for (bool isPinned : {false, true}) {
-        std::string const base = isPinned ? live + "/commits/{}" : live;
-        ioRoutes.push_back({"GET", base + "/assets", SignIn::Needed,
+        std::string const base = isPinned ? live + "/at/{}" : live;
+        ioRoutes.push_back({"GET", base + "/a", SignIn::Needed,
                             [isPinned](Call& ioCall) { return ListAssets(ioCall, isPinned, false); }});
-        ioRoutes.push_back({"GET", base + "/assets-full", SignIn::Needed,
+        ioRoutes.push_back({"GET", base + "/full", SignIn::Needed,
                             [isPinned](Call& ioCall) { return ListAssets(ioCall, isPinned, true); }});
-        ioRoutes.push_back({"GET", base + "/assets/{}", SignIn::Needed,
+        ioRoutes.push_back({"GET", base + "/a/{}", SignIn::Needed,
                             [isPinned](Call& ioCall) { return LoadAsset(ioCall, isPinned); }});
     }
-    ioRoutes.push_back({"POST", live + "/assets", SignIn::Needed, CreateAsset});
-    ioRoutes.push_back({"PUT", live + "/assets/{}", SignIn::Needed, EditAsset});
-    ioRoutes.push_back({"DELETE", live + "/assets/{}", SignIn::Needed, DeleteAsset});
+    ioRoutes.push_back({"POST", live + "/a", SignIn::Needed, CreateAsset});
+    ioRoutes.push_back({"PUT", live + "/a/{}", SignIn::Needed, EditAsset});
+    ioRoutes.push_back({"DELETE", live + "/a/{}", SignIn::Needed, DeleteAsset});
     ioRoutes.push_back({"POST", live + "/restore/{}", SignIn::Needed, RestoreAsset});
 }
 

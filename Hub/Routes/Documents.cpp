@@ -46,8 +46,8 @@ void LinkWriter::Write(std::string_view inBase, std::string_view inRelation, std
 DocumentWriter::DocumentWriter(std::string const& inApi, View const& inView)
     : mApi(inApi),
       mView(inView),
-      mLivePrefix(inApi + "/productions/" + PercentEncode(inView.line.id)),
-      mPrefix(inView.isPinned ? mLivePrefix + "/commits/" + PercentEncode(inView.commit.id) : mLivePrefix) {}
+      mLivePrefix(inApi + "/p/" + PercentEncode(inView.line.id)),
+      mPrefix(inView.isPinned ? mLivePrefix + "/at/" + PercentEncode(inView.commit.id) : mLivePrefix) {}
 
 std::string DocumentWriter::TagOf(std::string_view inKind, std::string_view inWhatDecides) const {
     std::string text(inKind);
@@ -75,7 +75,7 @@ std::string DocumentWriter::RenditionTag(RenditionState const& inRendition) cons
 }
 
 std::string DocumentWriter::AssetHref(std::string const& inAssetId) const {
-    return mPrefix + "/assets/" + PercentEncode(inAssetId);
+    return mPrefix + "/a/" + PercentEncode(inAssetId);
 }
 
 std::string DocumentWriter::LiveHref(std::string const& inHref) const {
@@ -99,14 +99,14 @@ void DocumentWriter::AppendProductionLinks(std::string& ioTarget) const {
     bool const isTemplate = mView.line.kind == kLineTemplate;
     links.Plain("self", mPrefix);
     links.Plain("latest-version", mLivePrefix);
-    links.Plain("up", mApi + (isTemplate ? "/productions/templates" : "/productions"));
-    links.Named("/assets", mPrefix + "/assets");
-    links.Named("/assets#full", mPrefix + "/assets-full");
-    links.Named("/assets/asset#byId", mLivePrefix + "/commits/{commitId}/assets/{assetId}");
-    links.Named("/enclosures", mPrefix + "/enclosures");
+    links.Plain("up", mApi + (isTemplate ? "/templates" : "/p"));
+    links.Named("/assets", mPrefix + "/a");
+    links.Named("/assets#full", mPrefix + "/full");
+    links.Named("/assets/asset#byId", mLivePrefix + "/at/{commitId}/a/{assetId}");
+    links.Named("/enclosures", mPrefix + "/e");
     if (IsWritable()) {
         links.Plain("edit", mLivePrefix);
-        links.Named("/assets/asset#create", mLivePrefix + "/assets");
+        links.Named("/assets/asset#create", mLivePrefix + "/a");
     }
     if (!mView.isPinned)
         links.Named(isTemplate ? "/productions/production#create-production" : "/productions/production#copy",
@@ -150,28 +150,24 @@ void DocumentWriter::AppendAsset(std::string& ioTarget, AssetState const& inAsse
         LinkWriter links(ioTarget);
         links.Plain("self", href);
         links.Plain("latest-version", LiveHref(href));
-        links.Named("/enclosures", href + "/enclosures");
-        links.Named("/renditions", href + "/renditions");
+        links.Named("/enclosures", href + "/e");
+        links.Named("/renditions", href + "/r");
         if (!inAsset.locator.empty())
-            links.Plain("locator", mApi + "/locators/" + PercentEncode(inAsset.locator));
+            links.Plain("locator", mApi + "/l/" + PercentEncode(inAsset.locator));
         if (IsWritable()) {
             links.Plain("edit", href);
             links.Plain("delete", href);
-            links.Named("/enclosures/enclosure#create", href + "/enclosures");
-            links.Named("/renditions/rendition#create", href + "/renditions");
+            links.Named("/enclosures/enclosure#create", href + "/e");
+            links.Named("/renditions/rendition#create", href + "/r");
         }
     }
-    if (inIsFull) {
-        ioTarget += ",\"enclosures\":";
-        AppendEnclosures(ioTarget, href, inAsset.enclosures);
-        ioTarget += ",\"renditions\":";
-        AppendRenditions(ioTarget, href, inAsset.renditions);
-    }
+    if (inIsFull)
+        AppendContainedLists(ioTarget, href, inAsset);
     ioTarget += '}';
 }
 
-void DocumentWriter::AppendEnclosures(std::string& ioTarget, std::string const& inOwner,
-                                      std::vector<EnclosureState> const& inEnclosures) const {
+void DocumentWriter::AppendEnclosureItems(std::string& ioTarget, std::string const& inOwner,
+                                          std::vector<EnclosureState> const& inEnclosures) const {
     ioTarget += "{\"enclosures\":[";
     for (auto const& enclosure : inEnclosures) {
         if (ioTarget.back() != '[')
@@ -179,21 +175,79 @@ void DocumentWriter::AppendEnclosures(std::string& ioTarget, std::string const& 
         AppendEnclosure(ioTarget, inOwner, enclosure);
     }
     ioTarget += ']';
+}
+
+void DocumentWriter::AppendRenditionItems(std::string& ioTarget, std::string const& inOwner,
+                                          std::vector<RenditionState> const& inRenditions) const {
+    ioTarget += "{\"renditions\":[";
+    for (auto const& rendition : inRenditions) {
+        if (ioTarget.back() != '[')
+            ioTarget += ',';
+        AppendRendition(ioTarget, inOwner, rendition);
+    }
+    ioTarget += ']';
+}
+
+void DocumentWriter::WriteFactoryLinks(LinkWriter& ioLinks, std::string const& inList) const {
+    if (IsWritable())
+        ioLinks.Plain("create", inList);
+}
+
+std::string DocumentWriter::EnclosureList(std::string const& inOwner,
+                                          std::vector<EnclosureState> const& inEnclosures) const {
+    std::string text;
+    AppendEnclosureItems(text, inOwner, inEnclosures);
+    BeginLinks(text);
+    {
+        LinkWriter links(text);
+        links.Plain("self", inOwner + "/e");
+        links.Plain("latest-version", LiveHref(inOwner) + "/e");
+        links.Named("/enclosures/enclosure#byContentId", mLivePrefix + "/ce/{contentId}");
+        WriteFactoryLinks(links, inOwner + "/e");
+    }
+    text += '}';
+    return text;
+}
+
+std::string DocumentWriter::RenditionList(std::string const& inOwner,
+                                          std::vector<RenditionState> const& inRenditions) const {
+    std::string text;
+    AppendRenditionItems(text, inOwner, inRenditions);
+    BeginLinks(text);
+    {
+        LinkWriter links(text);
+        links.Plain("self", inOwner + "/r");
+        links.Plain("latest-version", LiveHref(inOwner) + "/r");
+        WriteFactoryLinks(links, inOwner + "/r");
+    }
+    text += '}';
+    return text;
+}
+
+// What an asset contains has its address from the asset's own links; these are the ones that it has not.
+void DocumentWriter::AppendContainedLists(std::string& ioTarget, std::string const& inOwner,
+                                          AssetState const& inAsset) const {
+    ioTarget += ",\"enclosures\":";
+    AppendEnclosureItems(ioTarget, inOwner, inAsset.enclosures);
     BeginLinks(ioTarget);
     {
         LinkWriter links(ioTarget);
-        links.Plain("self", inOwner + "/enclosures");
-        links.Plain("latest-version", LiveHref(inOwner) + "/enclosures");
-        links.Named("/enclosures/enclosure#byContentId", mLivePrefix + "/contents/enclosures/{contentId}");
-        if (IsWritable())
-            links.Plain("create", inOwner + "/enclosures");
+        links.Named("/enclosures/enclosure#byContentId", mLivePrefix + "/ce/{contentId}");
+        WriteFactoryLinks(links, inOwner + "/e");
+    }
+    ioTarget += "},\"renditions\":";
+    AppendRenditionItems(ioTarget, inOwner, inAsset.renditions);
+    BeginLinks(ioTarget);
+    {
+        LinkWriter links(ioTarget);
+        WriteFactoryLinks(links, inOwner + "/r");
     }
     ioTarget += '}';
 }
 
 void DocumentWriter::AppendEnclosure(std::string& ioTarget, std::string const& inOwner,
                                      EnclosureState const& inEnclosure) const {
-    std::string const href = inOwner + "/enclosures/" + PercentEncode(inEnclosure.id);
+    std::string const href = inOwner + "/e/" + PercentEncode(inEnclosure.id);
     ioTarget += '{';
     AppendMember(ioTarget, "zo:etag", EnclosureTag(inEnclosure));
     AppendMember(ioTarget, "zo:enclosureContentId", inEnclosure.content);
@@ -203,39 +257,18 @@ void DocumentWriter::AppendEnclosure(std::string& ioTarget, std::string const& i
     {
         LinkWriter links(ioTarget);
         links.Plain("self", href);
-        links.Plain("latest-version", LiveHref(href));
-        links.Named("/enclosures/enclosure", mLivePrefix + "/payloads/enclosures/" + inEnclosure.content);
-        if (IsWritable()) {
-            links.Plain("edit", href);
-            links.Plain("delete", href);
-        }
-    }
-    ioTarget += '}';
-}
-
-void DocumentWriter::AppendRenditions(std::string& ioTarget, std::string const& inOwner,
-                                      std::vector<RenditionState> const& inRenditions) const {
-    ioTarget += "{\"renditions\":[";
-    for (auto const& rendition : inRenditions) {
-        if (ioTarget.back() != '[')
-            ioTarget += ',';
-        AppendRendition(ioTarget, inOwner, rendition);
-    }
-    ioTarget += ']';
-    BeginLinks(ioTarget);
-    {
-        LinkWriter links(ioTarget);
-        links.Plain("self", inOwner + "/renditions");
-        links.Plain("latest-version", LiveHref(inOwner) + "/renditions");
+        links.Named("/enclosures/enclosure", mLivePrefix + "/pe/" + inEnclosure.content);
+        if (mView.isPinned)
+            links.Plain("latest-version", LiveHref(href));
         if (IsWritable())
-            links.Plain("create", inOwner + "/renditions");
+            links.Plain("edit", href);
     }
     ioTarget += '}';
 }
 
 void DocumentWriter::AppendRendition(std::string& ioTarget, std::string const& inOwner,
                                      RenditionState const& inRendition) const {
-    std::string const href = inOwner + "/renditions/" + PercentEncode(inRendition.id);
+    std::string const href = inOwner + "/r/" + PercentEncode(inRendition.id);
     ioTarget += '{';
     AppendMember(ioTarget, "zo:renditionId", inRendition.id);
     AppendMember(ioTarget, "zo:renditionContentId", inRendition.content);
@@ -246,12 +279,11 @@ void DocumentWriter::AppendRendition(std::string& ioTarget, std::string const& i
     {
         LinkWriter links(ioTarget);
         links.Plain("self", href);
-        links.Plain("latest-version", LiveHref(href));
-        links.Named("/renditions/rendition", mLivePrefix + "/payloads/renditions/" + inRendition.content);
-        if (IsWritable()) {
+        links.Named("/renditions/rendition", mLivePrefix + "/pr/" + inRendition.content);
+        if (mView.isPinned)
+            links.Plain("latest-version", LiveHref(href));
+        if (IsWritable())
             links.Plain("edit-media", href + "/media");
-            links.Plain("delete", href);
-        }
     }
     ioTarget += '}';
 }

@@ -38,7 +38,7 @@ class DocumentWriter {
 public:
     DocumentWriter(std::string const& inApi, View const& inView);
 
-    std::string LivePrefix() const { return mLivePrefix; }  ///< ".../productions/<id>"
+    std::string LivePrefix() const { return mLivePrefix; }  ///< ".../p/<id>"
     std::string Prefix() const { return mPrefix; }          ///< with the commit when the view is pinned
 
     std::string ProductionTag() const;
@@ -53,13 +53,13 @@ public:
     void AppendAsset(std::string& ioTarget, AssetState const& inAsset, std::string const& inHash,
                      bool inIsFull) const;
 
-    /// inOwner is the prefix of an asset or of the production.
-    void AppendEnclosures(std::string& ioTarget, std::string const& inOwner,
-                          std::vector<EnclosureState> const& inEnclosures) const;
+    /// Lists of their own. inOwner is the prefix of an asset or of the production.
+    std::string EnclosureList(std::string const& inOwner,
+                              std::vector<EnclosureState> const& inEnclosures) const;
+    std::string RenditionList(std::string const& inOwner,
+                              std::vector<RenditionState> const& inRenditions) const;
     void AppendEnclosure(std::string& ioTarget, std::string const& inOwner,
                          EnclosureState const& inEnclosure) const;
-    void AppendRenditions(std::string& ioTarget, std::string const& inOwner,
-                          std::vector<RenditionState> const& inRenditions) const;
     void AppendRendition(std::string& ioTarget, std::string const& inOwner,
                          RenditionState const& inRendition) const;
 
@@ -69,6 +69,13 @@ public:
 private:
     std::string TagOf(std::string_view inKind, std::string_view inWhatDecides) const;
     std::string LiveHref(std::string const& inHref) const;
+    void AppendEnclosureItems(std::string& ioTarget, std::string const& inOwner,
+                              std::vector<EnclosureState> const& inEnclosures) const;
+    void AppendRenditionItems(std::string& ioTarget, std::string const& inOwner,
+                              std::vector<RenditionState> const& inRenditions) const;
+    void AppendContainedLists(std::string& ioTarget, std::string const& inOwner,
+                              AssetState const& inAsset) const;
+    void WriteFactoryLinks(LinkWriter& ioLinks, std::string const& inList) const;
     void AppendIdentity(std::string& ioTarget) const;
     void AppendProductionLinks(std::string& ioTarget) const;
 

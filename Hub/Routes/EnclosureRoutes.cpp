@@ -20,16 +20,14 @@ Response EnclosureResponse(Call& ioCall, ItemOwner const& inOwner, EnclosureStat
     Response response = JsonResponse(inStatus, std::move(text));
     response.etag = writer.EnclosureTag(inEnclosure);
     if (inStatus == 201)
-        response.headers.emplace_back("Location",
-                                      inOwner.Href() + "/enclosures/" + PercentEncode(inEnclosure.id));
+        response.headers.emplace_back("Location", inOwner.Href() + "/e/" + PercentEncode(inEnclosure.id));
     return response;
 }
 
 Response ListEnclosures(Call& ioCall, OwnerKind inKind) {
     ItemOwner owner(ioCall, inKind);
-    std::string text;
-    DocumentWriter(ioCall.api, owner.GetView()).AppendEnclosures(text, owner.Href(), owner.Enclosures());
-    return JsonResponse(200, std::move(text));
+    return JsonResponse(
+        200, DocumentWriter(ioCall.api, owner.GetView()).EnclosureList(owner.Href(), owner.Enclosures()));
 }
 
 Response LoadEnclosure(Call& ioCall, OwnerKind inKind) {
@@ -47,7 +45,7 @@ Response CreateEnclosure(Call& ioCall, OwnerKind inKind) {
     ItemOwner owner = ItemOwner::ForWriting(ioCall, inKind);
     FormPart const& payload = form.Get(":enclosure");
     EnclosureState enclosure;
-    enclosure.id = NewGuid();
+    enclosure.id = NewKey(kShortKey);
     enclosure.name = std::string(form.Get(":name").bytes);
     if (!IsEnclosureName(enclosure.name))
         throw Failure(
@@ -115,10 +113,9 @@ Response EnclosureByContent(Call& ioCall) {
     document["zo:enclosureId"] = enclosure.id;
     document["name"] = enclosure.name;
     std::string const prefix = DocumentWriter(ioCall.api, view).LivePrefix();
-    document["links"] =
-        Json::array({{{"rel", "self"}, {"href", prefix + "/contents/enclosures/" + enclosure.content}},
-                     {{"rel", std::string(kRelationBase) + "/enclosures/enclosure"},
-                      {"href", prefix + "/payloads/enclosures/" + enclosure.content}}});
+    document["links"] = Json::array({{{"rel", "self"}, {"href", prefix + "/ce/" + enclosure.content}},
+                                     {{"rel", std::string(kRelationBase) + "/enclosures/enclosure"},
+                                      {"href", prefix + "/pe/" + enclosure.content}}});
     return JsonResponse(200, JsonText(document));
 }
 
@@ -142,7 +139,7 @@ void AddEnclosureRoutes(std::vector<Route>& ioRoutes) {
     for (bool isAsset : {false, true}) {
         for (bool isPinned : {false, true}) {
             OwnerKind const kind{isAsset, isPinned};
-            std::string const list = kind.Pattern() + "/enclosures";
+            std::string const list = kind.Pattern() + "/e";
             ioRoutes.push_back(
                 {"GET", list, SignIn::Needed, [kind](Call& ioCall) { return ListEnclosures(ioCall, kind); }});
             ioRoutes.push_back({"GET", list + "/{}", SignIn::Needed,
@@ -158,10 +155,10 @@ void AddEnclosureRoutes(std::vector<Route>& ioRoutes) {
         }
     }
     std::string const production = OwnerKind().Pattern();
-    ioRoutes.push_back({"GET", production + "/contents/enclosures/{}", SignIn::Needed, EnclosureByContent});
-    ioRoutes.push_back({"GET", production + "/payloads/enclosures/{}", SignIn::Needed,
+    ioRoutes.push_back({"GET", production + "/ce/{}", SignIn::Needed, EnclosureByContent});
+    ioRoutes.push_back({"GET", production + "/pe/{}", SignIn::Needed,
                         [](Call& ioCall) { return Payload(ioCall, kReferenceEnclosure); }});
-    ioRoutes.push_back({"GET", production + "/payloads/renditions/{}", SignIn::Needed,
+    ioRoutes.push_back({"GET", production + "/pr/{}", SignIn::Needed,
                         [](Call& ioCall) { return Payload(ioCall, kReferenceRendition); }});
 }
 

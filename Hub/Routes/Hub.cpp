@@ -14,7 +14,7 @@ namespace zohub {
 namespace {
 
 constexpr std::size_t kMaxIdempotencyKey = 128;
-constexpr char kLoginSegments[] = "content/zo/api/v1/system/login";
+constexpr char kLoginSegments[] = "zo/1/system/login";
 
 std::string JoinedPath(Request const& inRequest) {
     std::string path;

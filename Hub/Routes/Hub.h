@@ -19,7 +19,7 @@ struct HubSettings {
     std::string name = "zohub";
     std::string description = "Development hub";
     Micros tokenLifetime = kDay;
-    std::size_t documentCacheBytes = 256u << 20;
+    std::size_t documentCacheBytes = 384u << 20;
 };
 
 /// One request on its way through a route, inside its database transaction.
@@ -33,7 +33,7 @@ struct Call {
     Actor actor;            ///< with an empty name when nobody is signed in
     std::string tokenHash;  ///< of the token that the request came with
     Micros now = 0;
-    std::string api;  ///< "http://host:port/content/zo/api/v1"
+    std::string api;  ///< "http://host:port/zo/1"
 
     /// For documents whose tag is known before they are made: the 304, when the client has them already.
     bool HasCurrent(std::string const& inETag) const { return IfNoneMatchHits(request, inETag); }
@@ -43,12 +43,12 @@ enum class SignIn { Needed, Optional };
 
 struct Route {
     std::string method;
-    std::string pattern;  ///< "productions/{}/assets"; {} stands for one segment
+    std::string pattern;  ///< "p/{}/a"; {} stands for one segment
     SignIn signIn = SignIn::Needed;
     std::function<Response(Call&)> handle;
 };
 
-inline constexpr char kApiPath[] = "content/zo/api/v1";
+inline constexpr char kApiPath[] = "zo/1";
 inline constexpr char kDiscoveryPath[] = "content/zo/api/discovery.json";
 
 /// Thread-safe.

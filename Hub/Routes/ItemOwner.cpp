@@ -6,11 +6,11 @@
 namespace zohub {
 
 std::string OwnerKind::Pattern() const {
-    std::string pattern = std::string(kApiPath) + "/productions/{}";
+    std::string pattern = std::string(kApiPath) + "/p/{}";
     if (isPinned)
-        pattern += "/commits/{}";
+        pattern += "/at/{}";
     if (isAsset)
-        pattern += "/assets/{}";
+        pattern += "/a/{}";
     return pattern;
 }
 

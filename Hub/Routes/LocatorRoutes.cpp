@@ -10,7 +10,7 @@ namespace zohub {
 namespace {
 
 Response LocatorResponse(Call& ioCall, LocatorRecord const& inLocator, int inStatus) {
-    std::string const href = ioCall.api + "/locators/" + PercentEncode(inLocator.id);
+    std::string const href = ioCall.api + "/l/" + PercentEncode(inLocator.id);
     std::string text = "{\"zo:mediaLocatorId\":";
     AppendJsonString(text, inLocator.id);
     text += ",\"properties\":" + inLocator.properties + ",\"links\":";
@@ -78,7 +78,7 @@ Response EditLocator(Call& ioCall) {
 }  // namespace
 
 void AddLocatorRoutes(std::vector<Route>& ioRoutes) {
-    std::string const base = std::string(kApiPath) + "/locators";
+    std::string const base = std::string(kApiPath) + "/l";
     ioRoutes.push_back({"POST", base, SignIn::Needed, CreateLocator});
     ioRoutes.push_back({"GET", base + "/{}", SignIn::Needed,
                         [](Call& ioCall) { return LocatorResponse(ioCall, GetLocator(ioCall), 200); }});

@@ -40,11 +40,11 @@ Response ListOf(Call& ioCall, std::string const& inKind, std::string const& inSe
 }
 
 Response ListProductions(Call& ioCall) {
-    return ListOf(ioCall, kLineProduction, ioCall.api + "/productions", true);
+    return ListOf(ioCall, kLineProduction, ioCall.api + "/p", true);
 }
 
 Response ListTemplates(Call& ioCall) {
-    return ListOf(ioCall, kLineTemplate, ioCall.api + "/productions/templates", false);
+    return ListOf(ioCall, kLineTemplate, ioCall.api + "/templates", false);
 }
 
 struct Creation {
@@ -121,14 +121,14 @@ View OpenForWriting(Call& ioCall) {
 }
 
 void AddProductionRoutes(std::vector<Route>& ioRoutes) {
-    std::string const base = std::string(kApiPath) + "/productions";
+    std::string const base = std::string(kApiPath) + "/p";
     ioRoutes.push_back({"GET", base, SignIn::Needed, ListProductions});
     ioRoutes.push_back({"POST", base, SignIn::Needed, CreateProduction});
-    ioRoutes.push_back({"GET", base + "/templates", SignIn::Needed, ListTemplates});
+    ioRoutes.push_back({"GET", std::string(kApiPath) + "/templates", SignIn::Needed, ListTemplates});
     ioRoutes.push_back({"GET", base + "/{}", SignIn::Needed, [](Call& ioCall) {
                             return ProductionResponse(ioCall, OpenView(ioCall, false), 200);
                         }});
-    ioRoutes.push_back({"GET", base + "/{}/commits/{}", SignIn::Needed, [](Call& ioCall) {
+    ioRoutes.push_back({"GET", base + "/{}/at/{}", SignIn::Needed, [](Call& ioCall) {
                             return ProductionResponse(ioCall, OpenView(ioCall, true), 200);
                         }});
     ioRoutes.push_back({"PUT", base + "/{}", SignIn::Needed, EditProduction});

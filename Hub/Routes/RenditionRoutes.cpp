@@ -18,16 +18,14 @@ Response RenditionResponse(Call& ioCall, ItemOwner const& inOwner, RenditionStat
     Response response = JsonResponse(inStatus, std::move(text));
     response.etag = writer.RenditionTag(inRendition);
     if (inStatus == 201)
-        response.headers.emplace_back("Location",
-                                      inOwner.Href() + "/renditions/" + PercentEncode(inRendition.id));
+        response.headers.emplace_back("Location", inOwner.Href() + "/r/" + PercentEncode(inRendition.id));
     return response;
 }
 
 Response ListRenditions(Call& ioCall, OwnerKind inKind) {
     ItemOwner owner(ioCall, inKind);
-    std::string text;
-    DocumentWriter(ioCall.api, owner.GetView()).AppendRenditions(text, owner.Href(), owner.Renditions());
-    return JsonResponse(200, std::move(text));
+    return JsonResponse(
+        200, DocumentWriter(ioCall.api, owner.GetView()).RenditionList(owner.Href(), owner.Renditions()));
 }
 
 Response LoadRendition(Call& ioCall, OwnerKind inKind) {
@@ -49,7 +47,7 @@ Response CreateRendition(Call& ioCall, OwnerKind inKind) {
     if (owner.Renditions().size() >= kMaxRenditions)
         throw Failure(413, "too-many-renditions", "No more renditions can be put here; remove some first.");
     RenditionState rendition;
-    rendition.id = NewGuid();
+    rendition.id = NewKey(kShortKey);
     rendition.type = FlavourOf(ioCall.request);
     rendition.size = ioCall.request.body.size();
     rendition.content = ioCall.repository.AddContent(ioCall.request.body);
@@ -103,7 +101,7 @@ void AddRenditionRoutes(std::vector<Route>& ioRoutes) {
     using Handler = Response (*)(Call&, OwnerKind);
     auto const add = [&ioRoutes](char const* inMethod, OwnerKind inKind, char const* inTail,
                                  Handler inHandler) {
-        ioRoutes.push_back({inMethod, inKind.Pattern() + "/renditions" + inTail, SignIn::Needed,
+        ioRoutes.push_back({inMethod, inKind.Pattern() + "/r" + inTail, SignIn::Needed,
                             [inKind, inHandler](Call& ioCall) { return inHandler(ioCall, inKind); }});
     };
     for (bool isPinned : {false, true}) {

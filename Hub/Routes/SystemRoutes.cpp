@@ -53,12 +53,11 @@ Response ServiceLinks(Call& ioCall) {
         } else {
             links.Named("/system/logout", api + "/system/logout");
             links.Named("/users/user#current", api + "/users/current");
-            links.Named("/productions", api + "/productions");
-            links.Named("/productions/templates", api + "/productions/templates");
-            links.Named("/productions/production#byIdAndCommitId",
-                        api + "/productions/{productionId}/commits/{commitId}");
-            links.Named("/medialocators", api + "/locators");
-            links.Named("/medialocator#byMediaLocatorId", api + "/locators/{mediaLocatorId}");
+            links.Named("/productions", api + "/p");
+            links.Named("/productions/templates", api + "/templates");
+            links.Named("/productions/production#byIdAndCommitId", api + "/p/{productionId}/at/{commitId}");
+            links.Named("/medialocators", api + "/l");
+            links.Named("/medialocator#byMediaLocatorId", api + "/l/{mediaLocatorId}");
         }
     }
     text += '}';
