@@ -154,3 +154,6 @@ ZOCL_EXPORT void GetXMPEnclosureMapForAssetList(const std::vector<IZOCAssetList:
                                                 XMPEnclosureMap& outMap);
 
 }  // namespace ZOCL
+
+// Last, since it speaks of assets itself: an item of a list holds a reference to its server.
+#include "ZOClient/IZOCDataServer.h"
