@@ -1,0 +1,39 @@
+// Start and end of the library: puts the floors together and takes them down in an order in which nothing is
+// used after it has gone.
+#include "Frame/Station.h"
+#include "Frame/SyslogLogger.h"
+#include "Model/ModelResourceFactory.h"
+#include "ostcore/threads/MainThread.h"
+#include "ostnet/http/RequestProcessor.h"
+#include "ResourceFactory.h"
+#include "ZOClient/Library.h"
+
+namespace ZOCL {
+
+namespace {
+
+/// Calls of Initialize that no Shutdown has matched yet. Main thread only.
+std::int32_t gInitCount = 0;
+
+}  // namespace
+
+void Initialize() {
+    if (gInitCount++ != 0) {
+        return;
+    }
+    ostcore::threads::SetMainThread();
+    RegisterStation();
+    GetCompositionRoot().resources = GetModelResourceFactory();
+}
+
+void Shutdown() {
+    if (gInitCount-- != 1) {
+        return;
+    }
+    ResetSyslogLogger();
+    // The network's last completions still make resources, so the factory goes after it.
+    ostnet::Shutdown();
+    GetCompositionRoot().resources = nullptr;
+}
+
+}  // namespace ZOCL

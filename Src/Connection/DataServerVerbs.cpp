@@ -1,0 +1,150 @@
+// The verbs: where each enters the chain, and their blocking forms.
+#include "Connection/DataServer.h"
+#include "Connection/SynchronousRequest.h"
+
+namespace ZOCL {
+
+using ostnet::Headers;
+using ostnet::http::Form;
+using ostnet::http::RequestOptions;
+
+void DataServer::TryToCancelRequest(const Guid& inRequestID) {
+    mChain.upload->TryToCancelRequest(inRequestID);
+}
+
+bool DataServer::GET(const Guid& inRequestID, const Completion& inCompletion, const ImmutableString& inURL,
+                     Headers inHeaders) {
+    const ImmutableString url = MakeRequestURL(inURL);
+    return !url.IsNull() &&
+           mChain.common->GET(inRequestID, inCompletion, url, std::move(inHeaders), RequestOptions());
+}
+
+bool DataServer::HEAD(const Guid& inRequestID, const Completion& inCompletion, const ImmutableString& inURL,
+                      Headers inHeaders) {
+    const ImmutableString url = MakeRequestURL(inURL);
+    return !url.IsNull() &&
+           mChain.common->HEAD(inRequestID, inCompletion, url, std::move(inHeaders), RequestOptions());
+}
+
+bool DataServer::DELETE(const Guid& inRequestID, const Completion& inCompletion, const ImmutableString& inURL,
+                        Headers inHeaders) {
+    const ImmutableString url = MakeRequestURL(inURL);
+    return !url.IsNull() &&
+           mChain.common->DELETE(inRequestID, inCompletion, url, std::move(inHeaders), RequestOptions());
+}
+
+bool DataServer::POST(const Guid& inRequestID, const Completion& inCompletion, const ImmutableString& inURL,
+                      Headers inHeaders, const Payload& inPayload) {
+    const ImmutableString url = MakeRequestURL(inURL);
+    const auto& entry = SupportsUploadCompression() ? mChain.upload : mChain.common;
+    return !url.IsNull() &&
+           entry->POST(inRequestID, inCompletion, url, std::move(inHeaders), inPayload, RequestOptions());
+}
+
+bool DataServer::POST(const Guid& inRequestID, const Completion& inCompletion, const ImmutableString& inURL,
+                      Headers inHeaders, const Form& inForm) {
+    const ImmutableString url = MakeRequestURL(inURL);
+    const auto& entry = SupportsUploadCompression() ? mChain.upload : mChain.common;
+    return !url.IsNull() &&
+           entry->POST(inRequestID, inCompletion, url, std::move(inHeaders), inForm, RequestOptions());
+}
+
+bool DataServer::PUT(const Guid& inRequestID, const Completion& inCompletion, const ImmutableString& inURL,
+                     Headers inHeaders, const Payload& inPayload) {
+    const ImmutableString url = MakeRequestURL(inURL);
+    const auto& entry = SupportsUploadCompression() ? mChain.upload : mChain.common;
+    return !url.IsNull() &&
+           entry->PUT(inRequestID, inCompletion, url, std::move(inHeaders), inPayload, RequestOptions());
+}
+
+bool DataServer::PUT(const Guid& inRequestID, const Completion& inCompletion, const ImmutableString& inURL,
+                     Headers inHeaders, const Form& inForm) {
+    const ImmutableString url = MakeRequestURL(inURL);
+    const auto& entry = SupportsUploadCompression() ? mChain.upload : mChain.common;
+    return !url.IsNull() &&
+           entry->PUT(inRequestID, inCompletion, url, std::move(inHeaders), inForm, RequestOptions());
+}
+
+bool DataServer::GETByContentID(const ImmutableString&, const Guid& inRequestID,
+                                const Completion& inCompletion, const ImmutableString& inURL) {
+    return GET(inRequestID, inCompletion, inURL, Headers());
+}
+
+DataServer::ResponseRef DataServer::WaitForResponse(
+    std::uint32_t inTimeoutMilliseconds, const function<bool(const Guid&, const Completion&)>& inStart) {
+    const Guid requestID = Guid::CreateUnique();
+    const auto data = boost::make_shared<SynchronousCompletionData>();
+    const bool started = inStart(
+        requestID, [data](const Guid&, const ResponseRef& inResponse) { data->Complete(inResponse); });
+    if (!started) {
+        return nullptr;
+    }
+    WaitForRequest(data->Gate(), requestID, inTimeoutMilliseconds, *mChain.upload);
+    return data->Response();
+}
+
+DataServer::ResponseRef DataServer::BlockingGET(const ImmutableString& inURL, Headers inHeaders,
+                                                std::uint32_t inTimeoutMilliseconds) {
+    return WaitForResponse(inTimeoutMilliseconds,
+                           [&](const Guid& inRequestID, const Completion& inCompletion) {
+                               return GET(inRequestID, inCompletion, inURL, inHeaders);
+                           });
+}
+
+DataServer::ResponseRef DataServer::BlockingHEAD(const ImmutableString& inURL, Headers inHeaders,
+                                                 std::uint32_t inTimeoutMilliseconds) {
+    return WaitForResponse(inTimeoutMilliseconds,
+                           [&](const Guid& inRequestID, const Completion& inCompletion) {
+                               return HEAD(inRequestID, inCompletion, inURL, inHeaders);
+                           });
+}
+
+DataServer::ResponseRef DataServer::BlockingDELETE(const ImmutableString& inURL, Headers inHeaders,
+                                                   std::uint32_t inTimeoutMilliseconds) {
+    return WaitForResponse(inTimeoutMilliseconds,
+                           [&](const Guid& inRequestID, const Completion& inCompletion) {
+                               return DELETE(inRequestID, inCompletion, inURL, inHeaders);
+                           });
+}
+
+DataServer::ResponseRef DataServer::BlockingPOST(const ImmutableString& inURL, Headers inHeaders,
+                                                 const Payload& inPayload,
+                                                 std::uint32_t inTimeoutMilliseconds) {
+    return WaitForResponse(inTimeoutMilliseconds,
+                           [&](const Guid& inRequestID, const Completion& inCompletion) {
+                               return POST(inRequestID, inCompletion, inURL, inHeaders, inPayload);
+                           });
+}
+
+DataServer::ResponseRef DataServer::BlockingPOST(const ImmutableString& inURL, Headers inHeaders,
+                                                 const Form& inForm, std::uint32_t inTimeoutMilliseconds) {
+    return WaitForResponse(inTimeoutMilliseconds,
+                           [&](const Guid& inRequestID, const Completion& inCompletion) {
+                               return POST(inRequestID, inCompletion, inURL, inHeaders, inForm);
+                           });
+}
+
+DataServer::ResponseRef DataServer::BlockingPUT(const ImmutableString& inURL, Headers inHeaders,
+                                                const Payload& inPayload,
+                                                std::uint32_t inTimeoutMilliseconds) {
+    return WaitForResponse(inTimeoutMilliseconds,
+                           [&](const Guid& inRequestID, const Completion& inCompletion) {
+                               return PUT(inRequestID, inCompletion, inURL, inHeaders, inPayload);
+                           });
+}
+
+DataServer::ResponseRef DataServer::BlockingPUT(const ImmutableString& inURL, Headers inHeaders,
+                                                const Form& inForm, std::uint32_t inTimeoutMilliseconds) {
+    return WaitForResponse(inTimeoutMilliseconds,
+                           [&](const Guid& inRequestID, const Completion& inCompletion) {
+                               return PUT(inRequestID, inCompletion, inURL, inHeaders, inForm);
+                           });
+}
+
+DataServer::ResponseRef DataServer::BlockingGETByContentID(const ImmutableString&,
+                                                           const ImmutableString& inURL,
+                                                           std::uint32_t inTimeoutMilliseconds) {
+    return BlockingGET(inURL, Headers(), inTimeoutMilliseconds);
+}
+
+}  // namespace ZOCL
