@@ -141,7 +141,7 @@ std::string Fill(const std::string& inText, const std::vector<U8String>& inArgum
     constexpr std::size_t kMostArguments = 10;
     std::vector<utility::Replacement> marks;
     for (std::size_t i = 0; i < std::min(inArguments.size(), kMostArguments); ++i) {
-        marks.emplace_back("@" + std::to_string(i), inArguments[i]);
+        marks.emplace_back(std::string{'@', static_cast<char>('0' + i)}, inArguments[i]);
     }
     return utility::ReplaceInString(inText, marks);
 }

@@ -234,8 +234,9 @@ void Trace(std::string_view inChannel, int inLevel, std::string_view inText) {
     if (!TraceEnabled(inChannel, inLevel)) {
         return;
     }
-    std::string line = "<" + std::to_string(CurrentThreadNumber()) + "> <" + std::string(inChannel) + "> <" +
-                       std::to_string(inLevel) + "> ";
+    std::string line("<");
+    line.append(std::to_string(CurrentThreadNumber())).append("> <").append(inChannel).append("> <");
+    line.append(std::to_string(inLevel)).append("> ");
     AppendAsOneLine(line, RedactSecrets(inText));
     const shared_ptr<TraceSink> sink = CurrentSink();
     try {

@@ -88,7 +88,8 @@ void CutUTF8(std::string& ioText, std::size_t inLongest) {
 
 std::string FormatSyslogLine(const SyslogOrigin& inOrigin, const ptime& inTime, SyslogSeverity inSeverity,
                              std::string_view inMessage, const SyslogFields& inFields) {
-    std::string line = "<" + std::to_string(kFacilityUser * 8 + static_cast<int>(inSeverity)) + ">1 ";
+    std::string line("<");
+    line.append(std::to_string(kFacilityUser * 8 + static_cast<int>(inSeverity))).append(">1 ");
     line += boost::posix_time::to_iso_extended_string(inTime) + "Z ";
     line += HeaderField(inOrigin.hostName, 255) + " " + HeaderField(inOrigin.clientName, 48) + " " +
             HeaderField(inOrigin.processID, 128) + " - ";

@@ -1,12 +1,14 @@
 // The pool behind ImmutableString: sharded by hash, one allocation per entry, no lock for a copy.
 #include "ostcore/utility/ImmutableString.h"
 
+#include <chrono>
 #include <cstring>
 #include <new>
 #include <ostream>
 #include <random>
+#include <thread>
 
-#include "ostcore/threads/Mutex.h"
+#include "ostcore/threads/ThreadAnnotations.h"
 
 namespace ostcore {
 namespace utility {
@@ -25,9 +27,6 @@ struct ImmutableString::Entry {
 namespace {
 
 using Entry = ImmutableString::Entry;
-using threads::Mutex;
-using threads::MutexLock;
-
 constexpr std::size_t kShardCount = 128;
 constexpr std::size_t kFirstBucketCount = 32;
 
@@ -37,10 +36,27 @@ std::uint64_t MultiplyAndFold(std::uint64_t inLeft, std::uint64_t inRight) noexc
     return static_cast<std::uint64_t>(product) ^ static_cast<std::uint64_t>(product >> 64);
 }
 
-std::uint64_t ReadWord(const char* inBytes, std::size_t inSize) noexcept {
-    std::uint64_t word = 0;
-    std::memcpy(&word, inBytes, inSize);
+std::uint64_t ReadWord(const char* inBytes) noexcept {
+    std::uint64_t word;
+    std::memcpy(&word, inBytes, sizeof(word));
     return word;
+}
+
+struct WordPair {
+    std::uint64_t first;
+    std::uint64_t second;
+};
+
+// Up to 16 bytes as two words; shorter texts are told apart by their size, which is hashed as well.
+WordPair ReadTail(const char* inBytes, std::size_t inSize) noexcept {
+    if (inSize >= sizeof(std::uint64_t)) {
+        return {ReadWord(inBytes), ReadWord(inBytes + inSize - sizeof(std::uint64_t))};
+    }
+    std::uint64_t word = 0;
+    for (std::size_t i = 0; i < inSize; ++i) {
+        word = (word << 8) | static_cast<unsigned char>(inBytes[i]);
+    }
+    return {word, 0};
 }
 
 // Seeded anew in each process, so that a peer cannot send texts that it knows to share a bucket.
@@ -53,12 +69,56 @@ std::uint64_t HashText(std::string_view inText) noexcept {
     std::uint64_t hash = seed ^ (inText.size() * 0x9E3779B97F4A7C15ull);
     const char* bytes = inText.data();
     std::size_t left = inText.size();
-    for (; left > sizeof(std::uint64_t); left -= sizeof(std::uint64_t), bytes += sizeof(std::uint64_t)) {
-        hash = MultiplyAndFold(hash ^ ReadWord(bytes, sizeof(std::uint64_t)), kFactor);
+    for (; left > sizeof(WordPair); left -= sizeof(WordPair), bytes += sizeof(WordPair)) {
+        hash =
+            MultiplyAndFold(hash ^ ReadWord(bytes), seed ^ ReadWord(bytes + sizeof(std::uint64_t)) ^ kFactor);
     }
-    hash = MultiplyAndFold(hash ^ ReadWord(bytes, left), kFactor);
+    const WordPair tail = ReadTail(bytes, left);
+    hash = MultiplyAndFold(hash ^ tail.first, seed ^ tail.second ^ kFactor);
     return MultiplyAndFold(hash ^ seed, kFactor);
 }
+
+/// The lock of a shard, made for the few instructions of a look-up: one atomic step to take it, a plain store
+/// to let it go. Who finds it held spins for about as long as a look-up takes, then lets others run; the naps
+/// in the end are for the case that the holder was put off the processor by a waiter of higher priority.
+class ZO_CAPABILITY("mutex") ShardMutex {
+public:
+    void Lock() const ZO_ACQUIRE() {
+        if (mIsHeld.exchange(true, std::memory_order_acquire)) {
+            WaitAndLock();
+        }
+    }
+    void Unlock() const ZO_RELEASE() { mIsHeld.store(false, std::memory_order_release); }
+
+private:
+    void WaitAndLock() const {
+        constexpr int kSpins = 64;
+        constexpr int kYields = 256;
+        for (int tries = 0;; ++tries) {
+            if (tries >= kYields) {
+                std::this_thread::sleep_for(std::chrono::microseconds(50));
+            } else if (tries >= kSpins) {
+                std::this_thread::yield();
+            }
+            if (!mIsHeld.load(std::memory_order_relaxed) &&
+                !mIsHeld.exchange(true, std::memory_order_acquire)) {
+                return;
+            }
+        }
+    }
+    mutable std::atomic<bool> mIsHeld{false};
+};
+
+class ZO_SCOPED_CAPABILITY ShardLock {
+public:
+    explicit ShardLock(const ShardMutex& inMutex) ZO_ACQUIRE(inMutex) : mMutex(inMutex) { inMutex.Lock(); }
+    ~ShardLock() ZO_RELEASE() { mMutex.Unlock(); }
+    ShardLock(const ShardLock&) = delete;
+    ShardLock& operator=(const ShardLock&) = delete;
+
+private:
+    const ShardMutex& mMutex;
+};
 
 /// One part of the pool: a chained hash table under its own lock.
 ///
@@ -77,7 +137,7 @@ std::uint64_t HashText(std::string_view inText) noexcept {
 class alignas(64) Shard {
 public:
     Entry* Intern(std::string_view inText, std::uint64_t inHash) ZO_EXCLUDES(mMutex) {
-        MutexLock lock(mMutex);
+        ShardLock lock(mMutex);
         for (Entry* entry = mBuckets[BucketOf(inHash)]; entry; entry = entry->next) {
             if (entry->hash == inHash && entry->size == inText.size() &&
                 std::memcmp(entry->Text(), inText.data(), inText.size()) == 0) {
@@ -92,23 +152,14 @@ public:
     }
 
     void DropLast(Entry* inEntry) ZO_EXCLUDES(mMutex) {
-        MutexLock lock(mMutex);
-        if (inEntry->count.fetch_sub(1, std::memory_order_acq_rel) != 1) {
-            return;  // a look-up was here first
+        if (RemoveIfLast(inEntry)) {
+            inEntry->~Entry();
+            ::operator delete(inEntry);
         }
-        Entry** link = &mBuckets[BucketOf(inEntry->hash)];
-        while (*link != inEntry) {
-            link = &(*link)->next;
-        }
-        *link = inEntry->next;
-        --mSize;
-        lock.Unlock();
-        inEntry->~Entry();
-        ::operator delete(inEntry);
     }
 
     std::size_t Size() const ZO_EXCLUDES(mMutex) {
-        MutexLock lock(mMutex);
+        ShardLock lock(mMutex);
         return mSize;
     }
 
@@ -116,6 +167,20 @@ private:
     // The low bits choose the shard, the bits above them the bucket.
     std::size_t BucketOf(std::uint64_t inHash) const ZO_REQUIRES(mMutex) {
         return static_cast<std::size_t>(inHash / kShardCount) & (mBuckets.size() - 1);
+    }
+
+    bool RemoveIfLast(Entry* inEntry) ZO_EXCLUDES(mMutex) {
+        ShardLock lock(mMutex);
+        if (inEntry->count.fetch_sub(1, std::memory_order_acq_rel) != 1) {
+            return false;  // a look-up was here first
+        }
+        Entry** link = &mBuckets[BucketOf(inEntry->hash)];
+        while (*link != inEntry) {
+            link = &(*link)->next;
+        }
+        *link = inEntry->next;
+        --mSize;
+        return true;
     }
 
     Entry* Insert(std::string_view inText, std::uint64_t inHash) ZO_REQUIRES(mMutex) {
@@ -143,7 +208,7 @@ private:
         }
     }
 
-    Mutex mMutex;
+    ShardMutex mMutex;
     std::vector<Entry*> mBuckets ZO_GUARDED_BY(mMutex) = std::vector<Entry*>(kFirstBucketCount);
     std::size_t mSize ZO_GUARDED_BY(mMutex) = 0;
 };
