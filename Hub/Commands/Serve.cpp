@@ -132,11 +132,6 @@ int RunServe(std::vector<std::string> const& inWords) {
     }
     server.Start();
 
-    std::cout << "zohub: listening on " << httpUrl << "\n";
-    if (!tlsUrl.empty())
-        std::cout << "zohub: listening on " << tlsUrl << "\nzohub: certificate authority " << CaFilePath(data)
-                  << "\n";
-    std::cout << std::flush;
     if (arguments.Has("--ready-file")) {
         std::string const caFile = tlsUrl.empty() ? std::string() : fs::absolute(CaFilePath(data)).string();
         WriteAtomically(arguments.Need("--ready-file"), "{\"httpUrl\":" + JsonString(httpUrl) +
@@ -144,6 +139,12 @@ int RunServe(std::vector<std::string> const& inWords) {
                                                             ",\"caFile\":" + JsonString(caFile) +
                                                             ",\"pid\":" + std::to_string(getpid()) + "}\n");
     }
+
+    std::cout << "zohub: listening on " << httpUrl << "\n";
+    if (!tlsUrl.empty())
+        std::cout << "zohub: listening on " << tlsUrl << "\nzohub: certificate authority " << CaFilePath(data)
+                  << "\n";
+    std::cout << std::flush;
 
     int received = 0;
     sigwait(&signals, &received);

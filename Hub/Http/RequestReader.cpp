@@ -105,6 +105,9 @@ void CheckHead(RequestHead const& inHead, std::optional<std::uint64_t> inContent
     std::size_t const codings = inHead.count(http::field::transfer_encoding);
     if (lengths > 1 || codings > 1 || (lengths == 1 && codings == 1))
         FailBadRequest("The length of the body is given more than once.");
+    if (lengths == 1 &&
+        ViewOf(inHead[http::field::content_length]).find_first_not_of("0123456789") != std::string_view::npos)
+        FailBadRequest("The length of the body is not one number.");
     if (codings == 1 && !EqualIgnoringCase(Trim(ViewOf(inHead[http::field::transfer_encoding])), "chunked"))
         throw Failure(501, "transfer-coding-unknown", "The only transfer coding taken here is chunked.");
     if (inHead.count(http::field::host) > 1 ||
