@@ -43,6 +43,11 @@ if(ZO_SANITIZE)
   endif()
 endif()
 
+if(ZO_BUILD_FUZZERS)
+  # The libraries under test report their coverage, not only the fuzzer's own source.
+  add_compile_options(-fsanitize=fuzzer-no-link)
+endif()
+
 # Asio hands executors over as templates by default; one polymorphic kind keeps compile times down.
 add_compile_definitions(BOOST_BIND_GLOBAL_PLACEHOLDERS)
 
