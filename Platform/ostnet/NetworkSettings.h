@@ -28,7 +28,8 @@ struct NetworkLimits {
     /// "ostnet.LowSpeedBytes", "ostnet.LowSpeedTime".
     std::uint32_t lowSpeedBytes = 1024;
     std::uint32_t lowSpeedTime = 30000;
-    /// Connections at one time; requests beyond them wait: "ostnet.MaximumConnections".
+    /// Requests on the wire at one time, and connections that are kept; requests beyond them wait in their
+    /// order. Taken when the processor is made: "ostnet.MaximumConnections".
     std::uint32_t maximumConnections = 128;
 };
 

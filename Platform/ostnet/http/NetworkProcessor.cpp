@@ -41,6 +41,17 @@ void TraceRequest(int inLevel, std::string_view inWhat, const Request& inRequest
     Trace(NetChannel(), inLevel, text);
 }
 
+/// The URL stays out: one that is not sound can hold anything anywhere.
+void TraceRefusal(const Request& inRequest, std::string_view inReason) {
+    if (NetChannel().IsEnabled(ostcore::debug::kTraceLevel_Error)) {
+        ostcore::debug::StructuredText text("A request was refused before anything was sent");
+        text.Add("request", inRequest.id.ToString())
+            .Add("verb", GetVerbName(inRequest.verb))
+            .Add("reason", inReason);
+        Trace(NetChannel(), ostcore::debug::kTraceLevel_Error, text);
+    }
+}
+
 }  // namespace
 
 /// What the processor is, apart from its handle: the register of requests, and the threads.
@@ -100,8 +111,8 @@ bool NetworkProcessor::Core::Start(Request inRequest, const Headers& inHeaders,
                                    const CompletionFunction& inCompletion) {
     const auto url = zourl::http::Create(inRequest.url);
     if (!url || !inCompletion || !AreSendable(inHeaders, kMaximumRequestHead)) {
-        TraceRequest(ostcore::debug::kTraceLevel_Error, "A request was refused before it was sent", inRequest,
-                     0, 0);
+        TraceRefusal(inRequest, url ? "a header, or its completion, is not sound"
+                                    : "its URL is not plain http or https");
         return false;
     }
     inRequest.isSecure = url->IsSecure();

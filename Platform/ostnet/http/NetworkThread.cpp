@@ -1,5 +1,7 @@
 #include "ostnet/http/NetworkThread.h"
 
+#include <openssl/err.h>
+#include <openssl/ssl.h>
 #include <sys/epoll.h>
 #include <sys/eventfd.h>
 #include <unistd.h>
@@ -35,9 +37,25 @@ const char* OrNone(const std::string& inText) noexcept {
     return inText.empty() ? nullptr : inText.c_str();
 }
 
+/// Takes nothing from the verdict. What a failed check has left in the error queue goes, so that the engine
+/// finds the verdict there first: else a certificate whose signature does not fit, as of an impostor under a
+/// trusted name, looks like a broken connection.
+int OnVerified(int inIsGood, X509_STORE_CTX*) {
+    if (inIsGood != 1) {
+        ERR_clear_error();
+    }
+    return inIsGood;
+}
+
+CURLcode OnTLSContext(CURL*, void* ioContext, void*) {
+    SSL_CTX_set_verify(static_cast<SSL_CTX*>(ioContext), SSL_VERIFY_PEER, &OnVerified);
+    return CURLE_OK;
+}
+
 void PrepareTrust(CURL* ioHandle, const NetworkSettings& inSettings) {
     curl_easy_setopt(ioHandle, CURLOPT_SSL_VERIFYPEER, 1L);
     curl_easy_setopt(ioHandle, CURLOPT_SSL_VERIFYHOST, 2L);
+    curl_easy_setopt(ioHandle, CURLOPT_SSL_CTX_FUNCTION, &OnTLSContext);
     curl_easy_setopt(ioHandle, CURLOPT_SSLVERSION, static_cast<long>(CURL_SSLVERSION_TLSv1_2));
     const auto& file = inSettings.certificateAuthorityFile;
     const auto& directory = inSettings.certificateAuthorityDirectory;
@@ -76,9 +94,12 @@ void Prepare(CURL* ioHandle, const NetworkSettings& inSettings) {
 
 }  // namespace
 
-NetworkThread::NetworkThread(Ended inEnded, Progressed inProgressed, std::uint32_t inMaximumConnections)
-    : mEnded(std::move(inEnded)), mProgressed(std::move(inProgressed)), mSweepEvery(kSlowestSweep) {
-    if (OpenEngine(inMaximumConnections)) {
+NetworkThread::NetworkThread(Ended inEnded, Progressed inProgressed, std::uint32_t inMostTransfers)
+    : mEnded(std::move(inEnded)),
+      mProgressed(std::move(inProgressed)),
+      mMostTransfers(std::max(inMostTransfers, 1u)),
+      mSweepEvery(kSlowestSweep) {
+    if (OpenEngine()) {
         mThread = StartThread([this] { Run(); });
         return;
     }
@@ -94,7 +115,7 @@ NetworkThread::~NetworkThread() {
     CloseAll();
 }
 
-bool NetworkThread::OpenEngine(std::uint32_t inMaximumConnections) {
+bool NetworkThread::OpenEngine() {
     static const CURLcode sGlobalInit = curl_global_init(CURL_GLOBAL_DEFAULT);
     mEpoll = epoll_create1(EPOLL_CLOEXEC);
     mWakeUp = eventfd(0, EFD_CLOEXEC | EFD_NONBLOCK);
@@ -107,8 +128,7 @@ bool NetworkThread::OpenEngine(std::uint32_t inMaximumConnections) {
     curl_multi_setopt(mMulti, CURLMOPT_TIMERFUNCTION, &NetworkThread::OnTimerChange);
     curl_multi_setopt(mMulti, CURLMOPT_TIMERDATA, this);
     curl_multi_setopt(mMulti, CURLMOPT_PIPELINING, static_cast<long>(CURLPIPE_MULTIPLEX));
-    curl_multi_setopt(mMulti, CURLMOPT_MAX_TOTAL_CONNECTIONS, static_cast<long>(inMaximumConnections));
-    curl_multi_setopt(mMulti, CURLMOPT_MAXCONNECTS, static_cast<long>(inMaximumConnections));
+    curl_multi_setopt(mMulti, CURLMOPT_MAXCONNECTS, static_cast<long>(mMostTransfers));
     epoll_event event{};
     event.events = EPOLLIN;
     event.data.fd = mWakeUp;
@@ -155,7 +175,7 @@ void NetworkThread::Stop() {
 }
 
 void NetworkThread::Run() {
-    do {
+    for (;;) {
         WaitForEvents();
         if (!TakeOrders()) {
             break;
@@ -163,14 +183,17 @@ void NetworkThread::Run() {
         RunEngineTimer();
         CollectEnded();
         CheckDeadlines();
+        BeginWaiting();
         if (!mEndedExchanges.empty()) {
             mEnded(mEndedExchanges);
             mEndedExchanges.clear();
         }
-    } while (true);
-    while (!mTransfers.empty()) {
-        DropTransfer(*mTransfers.begin()->second.exchange);
     }
+    mWaiting.clear();
+    while (!mTransfers.empty()) {
+        EndTransfer(mTransfers.begin()->first, CURLE_ABORTED_BY_CALLBACK);
+    }
+    mEndedExchanges.clear();
 }
 
 /// Orders that came before the thread could say that it sleeps keep it awake.
@@ -224,12 +247,11 @@ bool NetworkThread::TakeOrders() {
     if (orders.stop) {
         return false;
     }
-    for (auto& exchange : orders.begin) {
-        BeginTransfer(std::move(exchange));
-    }
+    std::move(orders.begin.begin(), orders.begin.end(), std::back_inserter(mWaiting));
     for (const auto& exchange : orders.drop) {
-        DropTransfer(*exchange);
+        DropExchange(exchange);
     }
+    BeginWaiting();
     return true;
 }
 
@@ -270,6 +292,14 @@ void NetworkThread::CheckDeadlines() {
     }
 }
 
+void NetworkThread::BeginWaiting() {
+    while (!mWaiting.empty() && mTransfers.size() < mMostTransfers) {
+        auto exchange = std::move(mWaiting.front());
+        mWaiting.pop_front();
+        BeginTransfer(std::move(exchange));
+    }
+}
+
 void NetworkThread::BeginTransfer(std::shared_ptr<Exchange> inExchange) {
     const auto now = Clock::now();
     const auto& settings = inExchange->GetRequest().settings;
@@ -298,11 +328,15 @@ void NetworkThread::BeginTransfer(std::shared_ptr<Exchange> inExchange) {
     }
 }
 
-void NetworkThread::DropTransfer(Exchange& ioExchange) {
-    if (CURL* handle = ioExchange.Handle()) {
+void NetworkThread::DropExchange(const std::shared_ptr<Exchange>& inExchange) {
+    if (CURL* handle = inExchange->Handle()) {
         const std::size_t before = mEndedExchanges.size();
         EndTransfer(handle, CURLE_ABORTED_BY_CALLBACK);
         mEndedExchanges.resize(before);
+        return;
+    }
+    if (const auto found = std::find(mWaiting.begin(), mWaiting.end(), inExchange); found != mWaiting.end()) {
+        mWaiting.erase(found);
     }
 }
 

@@ -4,6 +4,7 @@
 #include <curl/curl.h>
 
 #include <chrono>
+#include <deque>
 #include <functional>
 #include <memory>
 #include <thread>
@@ -20,7 +21,8 @@ namespace http {
 ///
 /// Orders (begin, drop) come in from any thread through a list; only when the thread sleeps does an order
 /// wake it, so that a busy thread takes many orders for one look at the list. Ended transfers leave in
-/// batches, on the network thread. A dropped exchange is not handed over.
+/// batches, on the network thread. Only so many transfers run at a time; the others wait here in their order,
+/// since the engine's own queue costs a look at all of it for each transfer that ends. A dropped exchange is not handed over.
 class NetworkThread {
 public:
     using Exchanges = std::vector<std::shared_ptr<Exchange>>;
@@ -29,7 +31,7 @@ public:
     /// An exchange whose observer has something to hear, likewise.
     using Progressed = std::function<void(const std::shared_ptr<Exchange>&)>;
 
-    NetworkThread(Ended inEnded, Progressed inProgressed, std::uint32_t inMaximumConnections);
+    NetworkThread(Ended inEnded, Progressed inProgressed, std::uint32_t inMostTransfers);
     ~NetworkThread();
     NetworkThread(const NetworkThread&) = delete;
     NetworkThread& operator=(const NetworkThread&) = delete;
@@ -59,7 +61,7 @@ private:
     };
 
     void Run();
-    bool OpenEngine(std::uint32_t inMaximumConnections);
+    bool OpenEngine();
     bool MayFallAsleep();
     void WaitForEvents();
     bool TakeOrders();
@@ -68,8 +70,9 @@ private:
     void CheckDeadlines();
     int MillisecondsToNextTimer(Clock::time_point inNow) const;
 
+    void BeginWaiting();
     void BeginTransfer(std::shared_ptr<Exchange> inExchange);
-    void DropTransfer(Exchange& ioExchange);
+    void DropExchange(const std::shared_ptr<Exchange>& inExchange);
     void EndTransfer(CURL* inHandle, CURLcode inResult);
     IdleHandle TakeHandle(const shared_ptr<NetworkSettings const>& inSettings);
     void KeepHandle(IdleHandle inHandle);
@@ -91,10 +94,12 @@ private:
     bool mIsStopped ZO_GUARDED_BY(mMutex) = false;
 
     // On the network thread only, once it has started.
+    const std::size_t mMostTransfers;
     CURLM* mMulti = nullptr;
     int mEpoll = -1;
     int mWakeUp = -1;
     std::unordered_map<CURL*, Transfer> mTransfers;
+    std::deque<std::shared_ptr<Exchange>> mWaiting;
     std::vector<IdleHandle> mIdleHandles;
     Exchanges mEndedExchanges;
     bool mHasEngineTimer = false;

@@ -4,6 +4,8 @@
 #include <boost/url/src.hpp>
 #include <boost/url/url_view.hpp>
 
+#include <charconv>
+
 #include "ostcore/utility/StringConversion.h"
 
 namespace zourl {
@@ -12,6 +14,21 @@ namespace {
 
 std::string ToString(boost::core::string_view inText) {
     return {inText.data(), inText.size()};
+}
+
+/// Reads what follows the host: nothing, or a colon and a port. False for all else.
+bool ReadPort(std::string_view inText, ostcore::optional<std::uint16_t>& outPort) {
+    if (inText.empty()) {
+        return true;
+    }
+    std::uint16_t port = 0;
+    const char* const end = inText.data() + inText.size();
+    const auto read = std::from_chars(inText.data() + 1, end, port);
+    if (inText.front() != ':' || read.ec != std::errc() || read.ptr != end || port == 0) {
+        return false;
+    }
+    outPort = port;
+    return true;
 }
 
 }  // namespace
@@ -44,7 +61,7 @@ ostcore::optional<URL> Create(std::string_view inText) {
     const boost::urls::url_view view = *parsed;
     const bool isSecure = view.scheme_id() == boost::urls::scheme::https;
     if ((!isSecure && view.scheme_id() != boost::urls::scheme::http) || !view.has_authority() ||
-        view.has_userinfo() || view.encoded_host().empty() || (view.has_port() && view.port_number() == 0)) {
+        view.has_userinfo() || view.encoded_host().empty() || view.encoded_host().contains('%')) {
         return {};
     }
     URL url;
@@ -53,8 +70,11 @@ ostcore::optional<URL> Create(std::string_view inText) {
     url.mHost = ostcore::utility::FoldCaseASCII(ToString(view.encoded_host()));
     url.mPath = ToString(view.encoded_path());
     url.mQuery = view.has_query() ? ToString(view.encoded_query()) : std::string();
-    if (view.has_port()) {
-        url.mPort = view.port_number();
+    const std::string authority = ToString(view.encoded_authority());
+    // The parser takes what follows a port's digits for a path, even without a slash.
+    const bool isPathSound = url.mPath.empty() || url.mPath.front() == '/';
+    if (!isPathSound || !ReadPort(std::string_view(authority).substr(url.mHost.size()), url.mPort)) {
+        return {};
     }
     return url;
 }

@@ -44,8 +44,9 @@ private:
     bool mIsSecure = false;
 };
 
-/// Reads a URL. None for any other scheme, a relative reference, an empty host, user information, a port that
-/// is no number from 1 to 65535, and a byte that RFC 3986 does not allow: blanks, controls, bytes over 127.
+/// Reads a URL. None for any other scheme, a relative reference, a host that is empty or escaped, user
+/// information, a port that is no number from 1 to 65535, and a byte that RFC 3986 does not allow: blanks,
+/// controls, bytes over 127.
 ZOPLATFORM_EXPORT ostcore::optional<URL> Create(std::string_view inText);
 /// The same; false, with outURL unchanged, when the text is no such URL.
 ZOPLATFORM_EXPORT bool Create(std::string_view inText, URL& outURL);
