@@ -116,6 +116,12 @@ int LendForReading(RegistryRoot inRoot, LentConnection& outConnection) {
     return outConnection.Acquire(inRoot, inRoot == RegistryRoot::User ? Mode::ReadWrite : Mode::ReadOnly);
 }
 
+int HasKey(RegistryRoot inRoot, const std::string& inPath) {
+    LentConnection connection;
+    const int result = LendForReading(inRoot, connection);
+    return result == kResultSuccess ? FindKey(*connection, inPath) : result;
+}
+
 /// Runs inWork(connection) as one write transaction that counts only when its result is success.
 template <class Work>
 int Write(RegistryRoot inRoot, RegistryAccess inAccess, Work&& inWork) {
@@ -256,11 +262,7 @@ int RegistryKey::Open(RegistryRoot inRoot, const UString& inPath, RegistryAccess
     if (!NormaliseRegistryPath(inPath, key.mPath)) {
         return kResultRegistryBadName;
     }
-    LentConnection connection;
-    int result = LendForReading(inRoot, connection);
-    if (result == kResultSuccess) {
-        result = FindKey(*connection, key.mPath);
-    }
+    const int result = HasKey(inRoot, key.mPath);
     if (result == kResultSuccess) {
         outKey = key;
     }
@@ -275,11 +277,14 @@ int RegistryKey::Create(RegistryRoot inRoot, const UString& inPath, RegistryKey&
         return kResultRegistryBadName;
     }
     bool isNew = false;
-    const int result = Write(inRoot, key.mAccess, [&](RegistryConnection& inConnection) {
-        const int found = FindKey(inConnection, key.mPath);
-        isNew = found == kResultRegistryMissing;
-        return isNew ? TouchKey(inConnection, key.mPath) : found;
-    });
+    int result = HasKey(inRoot, key.mPath);
+    if (result == kResultRegistryMissing) {
+        result = Write(inRoot, key.mAccess, [&](RegistryConnection& inConnection) {
+            const int found = FindKey(inConnection, key.mPath);
+            isNew = found == kResultRegistryMissing;
+            return isNew ? TouchKey(inConnection, key.mPath) : found;
+        });
+    }
     if (result == kResultSuccess) {
         outKey = key;
         if (outCreated) {

@@ -74,12 +74,12 @@ struct ZOPLATFORM_EXPORT RegistryChange {
 /// kResultRegistryMissing, writes make it again).
 ///
 /// Threads and processes: any number. Each operation is one transaction; either it happened as a whole or
-/// not at all, also when the process is killed in its middle. Readers are never kept waiting by a writer. A
-/// writer waits for another one for at most the time limit (SetRegistryTimeLimit) and then gives
-/// kResultRegistryBusy; so every operation blocks for a bounded time only, even when the process that holds
-/// the store is stopped.
-/// After fork() a child opens its own connections at its first operation; between fork and exec the registry
-/// may only be used when no other thread of the parent was using it at the fork.
+/// not at all, also when the process is killed in its middle. Readers of the user's root are never kept
+/// waiting by a writer, nor is Create of a key that exists. A writer waits for another one for at most the
+/// time limit (SetRegistryTimeLimit) and then gives kResultRegistryBusy; so every operation blocks for a
+/// bounded time only, even when the process that holds the store is stopped. After fork() a child opens its
+/// own connections at its first operation; between fork and exec the registry may only be used when no other
+/// thread of the parent was using it at the fork.
 class ZOPLATFORM_EXPORT RegistryKey {
 public:
     RegistryKey() = default;

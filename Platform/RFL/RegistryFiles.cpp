@@ -49,17 +49,6 @@ bool Identify(const struct stat& inStatus, RegistryFileIdentity& outIdentity) {
     return true;
 }
 
-/// Narrows the mode of a user's own file. The file is not opened for it: closing any descriptor of a file
-/// drops all locks that this process has on it, those of SQLite included.
-int CheckExisting(const std::string& inFile, bool inIsOfUser) {
-    struct stat status;
-    if (::lstat(inFile.c_str(), &status) != 0 || !S_ISREG(status.st_mode)) {
-        return kResultRegistryDamaged;
-    }
-    const bool isTooWide = inIsOfUser && (status.st_mode & 07177) != 0 && status.st_uid == ::geteuid();
-    return isTooWide && ::chmod(inFile.c_str(), 0600) != 0 ? kResultRegistryFailed : kResultSuccess;
-}
-
 }  // namespace
 
 std::string RegistryFile(RegistryRoot inRoot) {
@@ -78,6 +67,21 @@ bool MakeRegistryDirectory(RegistryRoot inRoot, const std::string& inFile) {
     return MakeDirectory(DirectoryOf(inFile), inRoot == RegistryRoot::User ? 0700 : 0755);
 }
 
+int CheckRegistryFile(RegistryRoot inRoot, const std::string& inFile) {
+    struct stat status;
+    if (::lstat(inFile.c_str(), &status) != 0) {
+        return errno == ENOENT || errno == ENOTDIR ? kResultRegistryMissing : kResultRegistryFailed;
+    }
+    if (!S_ISREG(status.st_mode)) {
+        return kResultRegistryDamaged;
+    }
+    // The file is not opened to change its mode: closing any descriptor of a file drops all locks that this
+    // process has on it, those of SQLite included.
+    const bool isOfUser = inRoot == RegistryRoot::User && status.st_uid == ::geteuid();
+    const bool isTooWide = isOfUser && (status.st_mode & 07177) != 0;
+    return isTooWide && ::chmod(inFile.c_str(), 0600) != 0 ? kResultRegistryFailed : kResultSuccess;
+}
+
 int CreateRegistryFile(RegistryRoot inRoot, const std::string& inFile) {
     const bool isOfUser = inRoot == RegistryRoot::User;
     const mode_t mode = isOfUser ? 0600 : 0644;
@@ -86,7 +90,7 @@ int CreateRegistryFile(RegistryRoot inRoot, const std::string& inFile) {
     }
     const int descriptor = ::open(inFile.c_str(), O_RDWR | O_CREAT | O_EXCL | O_CLOEXEC | O_NOFOLLOW, mode);
     if (descriptor < 0) {
-        return errno == EEXIST ? CheckExisting(inFile, isOfUser) : kResultRegistryFailed;
+        return errno == EEXIST ? CheckRegistryFile(inRoot, inFile) : kResultRegistryFailed;
     }
     const bool isNarrow = ::fchmod(descriptor, mode) == 0;
     ::close(descriptor);

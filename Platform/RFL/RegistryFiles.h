@@ -14,8 +14,11 @@ struct RegistryFileIdentity {
 };
 
 /// Makes the directory (0700 for the user, 0755 for the machine) and an empty file (0600, 0644) unless they
-/// are there, whatever the umask says. A user's file with a wider mode is narrowed to 0600.
+/// are there, whatever the umask says; checks what is there.
 int CreateRegistryFile(RegistryRoot inRoot, const std::string& inFile);
+
+/// Makes sure that there is a regular file and no link, and narrows the mode of a user's own file to 0600.
+int CheckRegistryFile(RegistryRoot inRoot, const std::string& inFile);
 
 /// Makes sure that a path names a regular file and no link, and gives the path with its directory resolved.
 int ResolveRegistryFile(const std::string& inFile, std::string& outFile, RegistryFileIdentity& outIdentity);

@@ -215,11 +215,10 @@ RegistryConnection::~RegistryConnection() {
 
 int RegistryConnection::Open(RegistryRoot inRoot, const std::string& inFile, Mode inMode,
                              std::unique_ptr<RegistryConnection>& outConnection) {
-    if (inMode == Mode::Create) {
-        const int result = CreateRegistryFile(inRoot, inFile);
-        if (result < 0) {
-            return result;
-        }
+    const int checked =
+        inMode == Mode::Create ? CreateRegistryFile(inRoot, inFile) : CheckRegistryFile(inRoot, inFile);
+    if (checked < 0) {
+        return checked;
     }
     std::string file;
     RegistryFileIdentity identity;

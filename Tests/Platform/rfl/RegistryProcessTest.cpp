@@ -18,19 +18,19 @@ protected:
         inArguments.insert(inArguments.begin(), kRegistryWorkerFlag);
         return std::make_unique<Process>(inArguments);
     }
-    /// The number of transactions of a run: small by default, as large as wanted for a campaign.
-    static int Transactions(int inDefault) {
-        const char* wanted = std::getenv("ZOCLIENT_TEST_REGISTRY_TRANSACTIONS");
+    /// The size of a run: small by default, as large as the environment wants it for a campaign.
+    static int SizeOfRun(const char* inVariable, int inDefault) {
+        const char* wanted = std::getenv(inVariable);
         return wanted ? std::atoi(wanted) : inDefault;
     }
 };
 
 TEST_F(RegistryProcesses, LoseNoUpdateOfEachOther) {
     const int processes = 8;
-    const int each = Transactions(2000) / processes;
+    const int each = SizeOfRun("ZOCLIENT_TEST_REGISTRY_TRANSACTIONS", 2000) / processes;
     std::vector<std::unique_ptr<Process>> workers;
     for (int worker = 0; worker < processes; ++worker) {
-        workers.push_back(Start({"increment", std::to_string(each)}));
+        workers.push_back(Start({"increment", std::to_string(each), "5000"}));
     }
     for (const auto& worker : workers) {
         EXPECT_EQ(worker->Wait(), 0);
@@ -42,7 +42,7 @@ TEST_F(RegistryProcesses, LoseNoUpdateOfEachOther) {
 
 TEST_F(RegistryProcesses, AreNotStoppedByOneThatIsKilledWhileItWrites) {
     std::mt19937 random(20160331);
-    for (int round = 0; round < 25; ++round) {
+    for (int round = SizeOfRun("ZOCLIENT_TEST_REGISTRY_KILLS", 25); round > 0; --round) {
         const auto writer = Start({"pairs"});
         std::string line;
         for (int lines = std::uniform_int_distribution<int>(1, 60)(random); lines > 0; --lines) {
@@ -93,4 +93,44 @@ TEST_F(RegistryProcesses, AWriterThatIsStoppedCostsOthersABoundedTime) {
     EXPECT_EQ(key.SetStringValue(u"Text", u"after"), 0);
     EXPECT_EQ(key.GetStringValue(u"Text", text), 0);
     EXPECT_EQ(text, u"after");
+}
+
+TEST_F(RegistryProcesses, GoOnWithoutLossWhenAStoppedWriterIsGone) {
+    MakeKey(kWorkerKey);
+    const auto holder = Start({"hold"});
+    std::string line;
+    ASSERT_TRUE(holder->ReadLine(line));
+    holder->Signal(SIGSTOP);
+    std::vector<std::unique_ptr<Process>> workers;
+    for (int worker = 0; worker < 4; ++worker) {
+        workers.push_back(Start({"increment", "100", "50"}));
+    }
+    for (const auto& worker : workers) {
+        ASSERT_TRUE(worker->ReadLine(line));
+        EXPECT_EQ(line, "busy");
+    }
+    holder->Signal(SIGKILL);
+    for (const auto& worker : workers) {
+        EXPECT_EQ(worker->Wait(), 0);
+    }
+    std::uint32_t value = 0;
+    EXPECT_EQ(MakeKey(kWorkerKey).GetUInt32Value(u"Counter", value), 0);
+    EXPECT_EQ(value, 400u);
+}
+
+TEST_F(RegistryProcesses, AFullDiskIsATypedErrorAndHarmsNothing) {
+    const auto writer = Start({"fill"});
+    EXPECT_EQ(writer->Wait(), 0);
+    const RegistryKey key = MakeKey(kWorkerKey);
+    std::uint32_t last = 0;
+    UString text;
+    EXPECT_EQ(key.GetUInt32Value(u"Last", last), 0);
+    const std::string name = std::to_string(last);
+    EXPECT_EQ(key.GetStringValue(UString(name.begin(), name.end()), text), 0);
+    EXPECT_EQ(text.size(), 20000u);
+    EXPECT_EQ(key.GetStringValue(u"After", text), 0);
+    CloseRegistry();
+    EXPECT_EQ(Ask(File(), "PRAGMA integrity_check"), "ok");
+    EXPECT_EQ(Ask(File(), "SELECT count(*) FROM vals WHERE name GLOB '[0-9]*'"), name)
+        << "each batch whole or not";
 }

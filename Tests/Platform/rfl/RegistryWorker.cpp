@@ -1,8 +1,10 @@
 #include "RegistryWorker.h"
 
 #include <sqlite3.h>
+#include <sys/resource.h>
 #include <unistd.h>
 
+#include <csignal>
 #include <cstdio>
 #include <cstdlib>
 #include <string>
@@ -12,14 +14,25 @@
 #include "RFL/Registry.h"
 
 using namespace RFL;
+using ostcore::UString;
 
 namespace {
 
+void Tell(const char* inLine) {
+    std::puts(inLine);
+    std::fflush(stdout);
+}
+
 int Increment(RegistryKey& ioKey, long inTimes) {
+    bool wasBusy = false;
     for (long done = 0; done < inTimes;) {
         std::uint32_t value = 0;
         const int result = ioKey.IncrementUInt32Value(u"Counter", 1, value);
         if (result == kResultRegistryBusy) {
+            if (!wasBusy) {
+                Tell("busy");
+            }
+            wasBusy = true;
             continue;
         }
         if (result != 0) {
@@ -29,6 +42,27 @@ int Increment(RegistryKey& ioKey, long inTimes) {
         ++done;
     }
     return 0;
+}
+
+/// Writes until a write fails for want of room, then makes room and looks whether the store still works.
+int FillUp(RegistryKey& ioKey) {
+    ::signal(SIGXFSZ, SIG_IGN);
+    rlimit limit{};
+    ::getrlimit(RLIMIT_FSIZE, &limit);
+    const rlimit tight{512 * 1024, limit.rlim_max};
+    ::setrlimit(RLIMIT_FSIZE, &tight);
+    int result = 0;
+    for (std::uint32_t number = 1; result == 0 && number < 1000; ++number) {
+        const std::string name = std::to_string(number);
+        result =
+            ioKey.Apply({RegistryChange::SetString(UString(name.begin(), name.end()), UString(20000, u'x')),
+                         RegistryChange::SetUInt32(u"Last", number)});
+    }
+    if (result != kResultRegistryFailed) {
+        return 1;
+    }
+    ::setrlimit(RLIMIT_FSIZE, &limit);
+    return ioKey.SetStringValue(u"After", u"works") == 0 ? 0 : 2;
 }
 
 int WritePairs(RegistryKey& ioKey) {
@@ -49,8 +83,7 @@ int Hold() {
                      nullptr) != SQLITE_OK) {
         return 1;
     }
-    std::puts("held");
-    std::fflush(stdout);
+    Tell("held");
     for (;;) {
         ::pause();
     }
@@ -67,11 +100,15 @@ int RunRegistryWorker(int inCount, char** inArguments) {
     if (RegistryKey::Create(RegistryRoot::User, kWorkerKey, key) != 0) {
         return 1;
     }
-    if (task == "increment" && inCount == 2) {
+    if (task == "increment" && inCount == 3) {
+        SetRegistryTimeLimit(std::chrono::milliseconds(std::atol(inArguments[2])));
         return Increment(key, std::atol(inArguments[1]));
     }
     if (task == "pairs") {
         return WritePairs(key);
+    }
+    if (task == "fill") {
+        return FillUp(key);
     }
     if (task == "set" && inCount == 3) {
         return key.SetStringValue(ostcore::utility::ToUTF16(inArguments[1]),
