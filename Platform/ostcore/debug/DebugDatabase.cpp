@@ -3,11 +3,11 @@
 
 #include <charconv>
 #include <cstdlib>
-#include <fstream>
 
 #include <unistd.h>
 
 #include "ostcore/config/StateDirectories.h"
+#include "ostcore/filesupport/File.h"
 #include "ostcore/threads/Mutex.h"
 #include "ostcore/utility/StringConversion.h"
 
@@ -36,16 +36,24 @@ std::string FilePath() {
     return config::GetConfigDirectory().FilePath("debug.conf");
 }
 
+void ReadLine(std::string_view inLine, Values& ioValues) {
+    const std::string_view text = Trimmed(inLine);
+    const std::size_t equals = text.find('=');
+    if (!text.empty() && text.front() != '#' && equals != std::string_view::npos) {
+        ioValues[std::string(Trimmed(text.substr(0, equals)))] =
+            std::string(Trimmed(text.substr(equals + 1)));
+    }
+}
+
 Values ReadFile() {
+    constexpr std::size_t kLargestFile = 1024 * 1024;
     Values values;
-    std::ifstream file(FilePath());
-    for (std::string line; std::getline(file, line);) {
-        const std::string_view text = Trimmed(line);
-        const std::size_t equals = text.find('=');
-        if (text.empty() || text.front() == '#' || equals == std::string_view::npos) {
-            continue;
-        }
-        values[std::string(Trimmed(text.substr(0, equals)))] = std::string(Trimmed(text.substr(equals + 1)));
+    const auto content = filesupport::File::Read(FilePath(), kLargestFile);
+    std::string_view text = content ? content->view() : std::string_view();
+    while (!text.empty()) {
+        const std::size_t end = std::min(text.find('\n'), text.size());
+        ReadLine(text.substr(0, end), values);
+        text.remove_prefix(std::min(end + 1, text.size()));
     }
     return values;
 }

@@ -9,7 +9,7 @@
 #include <unistd.h>
 
 #include "ostcore/config/ClientInfo.h"
-#include "ostcore/logging/SyslogLine.h"
+#include "ostcore/logging/detail/SyslogLine.h"
 #include "ostcore/threads/Executor.h"
 #include "ostcore/threads/Mutex.h"
 #include "ostcore/threads/Scheduler.h"

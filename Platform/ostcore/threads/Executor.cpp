@@ -1,9 +1,9 @@
 // The kinds of executor, each a queue over the threads that fit its work.
 #include "ostcore/threads/Executor.h"
 
-#include "ostcore/threads/ExecutorCore.h"
-#include "ostcore/threads/GuardedCall.h"
-#include "ostcore/threads/ThreadPools.h"
+#include "ostcore/threads/detail/ExecutorCore.h"
+#include "ostcore/threads/detail/GuardedCall.h"
+#include "ostcore/threads/detail/ThreadPools.h"
 
 namespace ostcore {
 namespace threads {

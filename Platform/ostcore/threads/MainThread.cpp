@@ -5,7 +5,7 @@
 #include <deque>
 #include <thread>
 
-#include "ostcore/threads/GuardedCall.h"
+#include "ostcore/threads/detail/GuardedCall.h"
 #include "ostcore/threads/Mutex.h"
 
 namespace ostcore {

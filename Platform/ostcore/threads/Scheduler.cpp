@@ -7,7 +7,7 @@
 
 #include <boost/date_time/posix_time/posix_time_types.hpp>
 
-#include "ostcore/threads/GuardedCall.h"
+#include "ostcore/threads/detail/GuardedCall.h"
 #include "ostcore/threads/Mutex.h"
 
 namespace ostcore {

@@ -12,9 +12,6 @@ namespace utility {
 
 /// UTF-16 to UTF-8. A lone surrogate becomes U+FFFD; never throws for bad text.
 ZOPLATFORM_EXPORT U8String ToUTF8(std::u16string_view inText);
-inline U8String ToUTF8(const UString& inText) {
-    return ToUTF8(std::u16string_view(inText));
-}
 
 /// UTF-8 to UTF-16. Each maximal subpart of an ill-formed sequence becomes one U+FFFD (Unicode, section 3.9,
 /// "U+FFFD Substitution of Maximal Subparts"); surrogates and overlong forms are ill-formed.

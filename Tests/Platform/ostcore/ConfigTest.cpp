@@ -1,7 +1,7 @@
 // The debug database, localised texts, directories, and who this process is.
 #include <gtest/gtest.h>
 
-#include <sys/stat.h>
+#include <unistd.h>
 
 #include "HLM/HLM.h"
 #include "ostcore/config/ClientInfo.h"
@@ -124,7 +124,23 @@ TEST(Headless, IsWhatTheHostSaid) {
     const bool former = HLM::GetIsHeadless();
     HLM::SetIsHeadless(true);
     EXPECT_TRUE(HLM::GetIsHeadless());
+    HLM::SetIsHeadless(false);
+    EXPECT_FALSE(HLM::GetIsHeadless());
     HLM::SetIsHeadless(former);
+}
+
+// In a process of its own, since the variable is read once.
+int HeadlessWith(const char* inValue) {
+    ::setenv("ZOCLIENT_HEADLESS", inValue, 1);
+    return HLM::GetIsHeadless() ? 1 : 0;
+}
+
+TEST(HeadlessDeathTest, TheEnvironmentIsAskedUntilTheHostSpeaks) {
+    GTEST_FLAG_SET(death_test_style, "threadsafe");
+    EXPECT_EXIT(::_exit(HeadlessWith("1")), testing::ExitedWithCode(1), "");
+    EXPECT_EXIT(::_exit(HeadlessWith("yes")), testing::ExitedWithCode(1), "");
+    EXPECT_EXIT(::_exit(HeadlessWith("0")), testing::ExitedWithCode(0), "");
+    EXPECT_EXIT(::_exit(HeadlessWith("False")), testing::ExitedWithCode(0), "");
 }
 
 }  // namespace

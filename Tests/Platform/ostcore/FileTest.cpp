@@ -7,6 +7,8 @@
 #include <string>
 #include <thread>
 
+#include <signal.h>
+#include <sys/resource.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -45,6 +47,41 @@ TEST(File, AFailedReplacementLeavesTheOldContentAndSaysWhy) {
     ASSERT_EQ(::mkdir(directory.Path("taken").c_str(), 0700), 0);
     EXPECT_FALSE(File::ReplaceAtomically(directory.Path("taken"), "x", 0600, &error));
     EXPECT_TRUE(directory.Dir().ListFiles().empty());
+}
+
+/// Lets no file of the process grow beyond a size, as a full disk would.
+class ScopedFileSizeLimit {
+public:
+    explicit ScopedFileSizeLimit(rlim_t inBytes) : mFormerHandler(::signal(SIGXFSZ, SIG_IGN)) {
+        ::getrlimit(RLIMIT_FSIZE, &mFormer);
+        const rlimit limit{inBytes, mFormer.rlim_max};
+        ::setrlimit(RLIMIT_FSIZE, &limit);
+    }
+    ~ScopedFileSizeLimit() {
+        ::setrlimit(RLIMIT_FSIZE, &mFormer);
+        ::signal(SIGXFSZ, mFormerHandler);
+    }
+    ScopedFileSizeLimit(const ScopedFileSizeLimit&) = delete;
+    ScopedFileSizeLimit& operator=(const ScopedFileSizeLimit&) = delete;
+
+private:
+    rlimit mFormer{};
+    void (*const mFormerHandler)(int);
+};
+
+TEST(File, RunningOutOfRoomKeepsTheOldContent) {
+    const TemporaryDirectory directory;
+    const std::string path = directory.Path("state");
+    ASSERT_TRUE(File::ReplaceAtomically(path, "old"));
+    std::string error;
+    {
+        const ScopedFileSizeLimit limit(64 * 1024);
+        EXPECT_FALSE(File::ReplaceAtomically(path, std::string(200000, 'n'), 0600, &error));
+    }
+    EXPECT_EQ(error, "Could not replace the file " + path + ": File too large.");
+    ASSERT_TRUE(File::Read(path));
+    EXPECT_EQ(File::Read(path)->view(), "old");
+    EXPECT_EQ(directory.Dir().ListFiles(), std::vector<std::string>{"state"});
 }
 
 // Readers see one of the whole contents, never a mixture or a part.

@@ -1,5 +1,5 @@
 // The text of one syslog line.
-#include "ostcore/logging/SyslogLine.h"
+#include "ostcore/logging/detail/SyslogLine.h"
 
 #include <boost/date_time/posix_time/posix_time.hpp>
 

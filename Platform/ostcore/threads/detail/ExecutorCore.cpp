@@ -1,9 +1,9 @@
 // The queue of one executor and its turns.
-#include "ostcore/threads/ExecutorCore.h"
+#include "ostcore/threads/detail/ExecutorCore.h"
 
 #include <chrono>
 
-#include "ostcore/threads/GuardedCall.h"
+#include "ostcore/threads/detail/GuardedCall.h"
 
 namespace ostcore {
 namespace threads {

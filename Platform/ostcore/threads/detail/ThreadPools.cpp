@@ -1,5 +1,5 @@
 // The threads behind the executors.
-#include "ostcore/threads/ThreadPools.h"
+#include "ostcore/threads/detail/ThreadPools.h"
 
 #include <chrono>
 #include <system_error>

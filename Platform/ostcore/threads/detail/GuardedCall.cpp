@@ -1,5 +1,5 @@
 // Calls a function of unknown origin so that its exception ends here, in a trace.
-#include "ostcore/threads/GuardedCall.h"
+#include "ostcore/threads/detail/GuardedCall.h"
 
 #include <exception>
 
