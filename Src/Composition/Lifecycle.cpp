@@ -4,7 +4,7 @@
 #include "Frame/SyslogLogger.h"
 #include "Model/ModelResourceFactory.h"
 #include "ostcore/threads/MainThread.h"
-#include "ostnet/http/RequestProcessor.h"
+#include "ostnet/http/NetworkProcessor.h"
 #include "ResourceFactory.h"
 #include "ZOClient/Library.h"
 
@@ -22,6 +22,7 @@ void Initialize() {
         return;
     }
     ostcore::threads::SetMainThread();
+    ostnet::Startup();
     RegisterStation();
     GetCompositionRoot().resources = GetModelResourceFactory();
 }
