@@ -65,17 +65,24 @@ TEST(ImmutableString, ManyTextsSurviveTheGrowthOfTheTables) {
     EXPECT_EQ(ImmutableString::PoolSize(), before);
 }
 
-// The few texts are born and die all the time, so that look-ups meet last drops.
+// One text is born and dies all the time, so that look-ups meet last drops in every way.
 TEST(ImmutableString, LookUpsRaceWithLastDropsAndThePoolComesBackToItsSize) {
     const std::size_t before = ImmutableString::PoolSize();
+    const std::string text = "the raced text";
     std::atomic<int> wrong{0};
-    RunOnThreads(4, [&](int inThread) {
-        for (int i = 0; i < 40000; ++i) {
-            const std::string text = "raced text " + std::to_string((i + inThread) % 3);
+    RunOnThreads(4, [&](int) {
+        for (int i = 0; i < 200000; ++i) {
             const ImmutableString one(text);
+            wrong += one.size() != text.size();
+        }
+    });
+    RunOnThreads(4, [&](int inThread) {
+        for (int i = 0; i < 20000; ++i) {
+            const std::string mine = text + std::to_string((i + inThread) % 3);
+            const ImmutableString one(mine);
             const ImmutableString copy = one;
-            const ImmutableString two(text);
-            wrong += one != two || copy.view() != text;
+            const ImmutableString two(mine);
+            wrong += one != two || copy.view() != mine;
         }
     });
     EXPECT_EQ(wrong, 0);
