@@ -88,6 +88,8 @@ public:
                                       const ImmutableString& inContentType);
     /// Null when there is no such file.
     shared_ptr<ostnet::Response> PostFile(const std::string& inPath, const ImmutableString& inContentType);
+    /// The asynchronous posts install the answer: one with a Location makes this resource point at what was
+    /// created.
     bool Post(const shared_ptr<RecycledMemory const>& inBody, const ostnet::Headers& inHeaders,
               const Guid& inRequestID, const RequestCompletion& inCompletion);
     shared_ptr<ostnet::Response> PostMultiPart(const ostnet::http::Form& inForm);

@@ -51,7 +51,7 @@ shared_ptr<ostnet::Response> ServerResource::PostFile(const std::string& inPath,
 
 bool ServerResource::Post(const shared_ptr<RecycledMemory const>& inBody, const ostnet::Headers& inHeaders,
                           const Guid& inRequestID, const RequestCompletion& inCompletion) {
-    return GetServer()->POST(inRequestID, MakeCompletionFunction(inCompletion, false, true), GetHTTPURL(),
+    return GetServer()->POST(inRequestID, MakeCompletionFunction(inCompletion, true, true), GetHTTPURL(),
                              inHeaders, inBody);
 }
 
@@ -66,7 +66,7 @@ shared_ptr<ostnet::Response> ServerResource::PostMultiPart(const ostnet::http::F
 
 bool ServerResource::PostMultiPart(const ostnet::http::Form& inForm, const Guid& inRequestID,
                                    const RequestCompletion& inCompletion) {
-    return GetServer()->POST(inRequestID, MakeCompletionFunction(inCompletion, false, true), GetHTTPURL(),
+    return GetServer()->POST(inRequestID, MakeCompletionFunction(inCompletion, true, true), GetHTTPURL(),
                              ostnet::Headers(), inForm);
 }
 

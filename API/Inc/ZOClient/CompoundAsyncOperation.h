@@ -3,6 +3,7 @@
 #pragma once
 
 #include <deque>
+#include <functional>
 #include <map>
 #include <tuple>
 #include <type_traits>
@@ -140,17 +141,25 @@ private:
     template <class C, class R, class... A>
     struct CallShape<R (C::*)(A...)> : CallShape<R (*)(A...)> {};
 
+    template <class Signature>
+    static bool IsEmpty(const function<Signature>& inFunction) {
+        return inFunction.empty();
+    }
+    template <class Signature>
+    static bool IsEmpty(const std::function<Signature>& inFunction) {
+        return !inFunction;
+    }
+    template <class F>
+    static bool IsEmpty(const F&) {
+        return false;
+    }
     static IntermediateCompletion MakeUniform(std::nullptr_t) { return IntermediateCompletion(); }
     static IntermediateCompletion MakeUniform(const IntermediateCompletion& inFunction) { return inFunction; }
     template <class F>
     static IntermediateCompletion MakeUniform(const F& inFunction) {
         using Arguments = typename CallShape<std::decay_t<F>>::Arguments;
-        // Function objects that can be empty; lambdas convert to bool by way of a pointer and never are.
-        if constexpr (std::is_constructible<bool, const F&>::value &&
-                      !std::is_convertible<const F&, bool>::value) {
-            if (!static_cast<bool>(inFunction)) {
-                return IntermediateCompletion();
-            }
+        if (IsEmpty(inFunction)) {
+            return IntermediateCompletion();
         }
         return MakeUniformFor(inFunction, static_cast<Arguments*>(nullptr));
     }
