@@ -9,7 +9,7 @@ namespace {
 constexpr char kHelp[] = R"(zohub, a collaboration hub for one machine
 
   zohub serve [--port N] [--tls-port N] [--no-tls] [--listen ADDRESS] [--ready-file FILE]
-              [--token-lifetime SECONDS] [--max-connections N] [--max-body BYTES] [--workers N]
+              [--token-lifetime SECONDS] [--max-connections N] [--max-body BYTES] [--read-threads N]
               [--header-timeout-ms N] [--body-timeout-ms N]
   zohub user add NAME --password-file FILE|--password-stdin [--admin] [--replace]
               [--first-name TEXT] [--last-name TEXT] [--email TEXT]

@@ -81,8 +81,8 @@ ServerLimits ReadLimits(Arguments const& inArguments) {
         "--header-timeout-ms", static_cast<std::uint64_t>(limits.header.count()), 3600000));
     limits.bodyGrace = std::chrono::milliseconds(inArguments.Number(
         "--body-timeout-ms", static_cast<std::uint64_t>(limits.bodyGrace.count()), 3600000));
-    limits.workerThreads =
-        std::max<std::uint64_t>(1, inArguments.Number("--workers", limits.workerThreads, 256));
+    limits.readThreads =
+        std::max<std::uint64_t>(1, inArguments.Number("--read-threads", limits.readThreads, 256));
     return limits;
 }
 
@@ -99,7 +99,7 @@ int RunServe(std::vector<std::string> const& inWords) {
                                         {"--max-body"},
                                         {"--header-timeout-ms"},
                                         {"--body-timeout-ms"},
-                                        {"--workers"},
+                                        {"--read-threads"},
                                         {"--no-tls", false}});
     arguments.Words(0, "serve [options]");
     // Before any thread starts, so that all of them leave these signals to this one.
@@ -119,7 +119,7 @@ int RunServe(std::vector<std::string> const& inWords) {
     std::string const address = arguments.Get("--listen", "127.0.0.1");
     Server server(
         ReadLimits(arguments), [&hub](Request const& inRequest) { return hub.Handle(inRequest); },
-        Hub::IsSlow);
+        Hub::LaneOf);
     auto const plainPort = server.ListenPlain(
         address, static_cast<std::uint16_t>(arguments.Number("--port", kPlainPort, 65535)));
     std::string const httpUrl = "http://" + HostInUrl(address) + ":" + std::to_string(plainPort);

@@ -29,7 +29,7 @@ using TlsStream = beast::ssl_stream<beast::tcp_stream>;
 
 constexpr std::size_t kWriteStep = 256 * 1024;
 constexpr std::size_t kPackFrom = 1024;
-constexpr std::size_t kMaxSlowWaiting = 64;
+constexpr std::size_t kMaxSignInsWaiting = 64;
 constexpr std::size_t kMaxDrained = 4 << 20;
 constexpr std::chrono::seconds kLinger{2};
 
@@ -252,28 +252,37 @@ private:
         } catch (Failure const& failure) {
             return Refuse(failure);
         }
-        bool const isSlow = mCore.isSlow(request);
-        if (isSlow && ++mCore.slowWaiting > kMaxSlowWaiting) {
-            --mCore.slowWaiting;
+        Lane const lane = mCore.laneOf(request);
+        if (lane == Lane::SignIn && ++mCore.signInsWaiting > kMaxSignInsWaiting) {
+            --mCore.signInsWaiting;
             return Refuse(
                 Failure(503, "too-many-logins", "Too many sign-ins at once; try again in a moment."));
         }
-        auto job = [self = Self(), request = std::move(request), keepAlive, isSlow]() mutable {
-            Response const response = self->mCore.handler(request);
-            if (isSlow)
-                --self->mCore.slowWaiting;
-            bool const goesOn = keepAlive && !self->mCore.isStopping;
-            Outgoing out = MakeOutgoing(response, request.method == "HEAD", AcceptsGzip(request), goesOn);
-            request = Request();
-            // The executor is copied out: once posted, the connection may end on another thread.
-            auto const executor = self->mStream.get_executor();
-            asio::post(executor, [self = std::move(self), out = std::move(out)]() mutable {
-                self->ReleaseBodyBytes();
-                self->mStarted = SteadyClock::now();
-                self->Send(std::move(out));
-            });
-        };
-        asio::post(isSlow ? mCore.slowWorker : mCore.workers, std::move(job));
+        asio::post(mCore.PoolOf(lane),
+                   [self = Self(), request = std::move(request), keepAlive, lane]() mutable {
+                       Outgoing out = self->Work(std::move(request), keepAlive);
+                       if (lane == Lane::SignIn)
+                           --self->mCore.signInsWaiting;
+                       // The executor is copied out: once posted, the connection may end on another thread.
+                       auto const executor = self->mStream.get_executor();
+                       asio::post(executor, [self = std::move(self), out = std::move(out)]() mutable {
+                           self->ReleaseBodyBytes();
+                           self->mStarted = SteadyClock::now();
+                           self->Send(std::move(out));
+                       });
+                   });
+    }
+
+    // On a worker. Packing can run out of memory; the client shall hear of it all the same.
+    Outgoing Work(Request inRequest, bool inKeepAlive) const {
+        bool const isHead = inRequest.method == "HEAD";
+        try {
+            Response const response = mCore.handler(inRequest);
+            return MakeOutgoing(response, isHead, AcceptsGzip(inRequest), inKeepAlive && !mCore.isStopping);
+        } catch (std::exception const&) {
+            return MakeOutgoing(ErrorResponse(500, "internal-error", "The hub could not make its answer."),
+                                isHead, false, false);
+        }
     }
 
     void Send(Outgoing inOutgoing) {

@@ -180,7 +180,9 @@ std::string WriteResponseHead(Response const& inResponse, std::size_t inLength, 
         add("ETag", inResponse.etag);
     add("Cache-Control", inResponse.isImmutable ? "private, max-age=31536000, immutable" : "no-cache");
     add("Vary", "Accept-Encoding, Cookie");
+    // Payloads are what users put there; a browser must not run them in the hub's name.
     add("X-Content-Type-Options", "nosniff");
+    add("Content-Security-Policy", "default-src 'none'; sandbox");
     for (auto const& [name, value] : inResponse.headers)
         add(name, value);
     if (inResponse.status != 204 && inResponse.status != 304)

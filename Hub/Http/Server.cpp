@@ -5,6 +5,7 @@
 #include <boost/asio/ip/v6_only.hpp>
 #include <boost/asio/steady_timer.hpp>
 #include <boost/asio/strand.hpp>
+#include <iostream>
 #include <stdexcept>
 #include <thread>
 
@@ -85,8 +86,8 @@ private:
 
 class Server::Implementation {
 public:
-    Implementation(ServerLimits const& inLimits, RequestHandler inHandler, SlowRequestTest inIsSlow)
-        : mCore(inLimits, std::move(inHandler), std::move(inIsSlow)), mWork(mCore.io.get_executor()) {}
+    Implementation(ServerLimits const& inLimits, RequestHandler inHandler, LaneFunction inLaneOf)
+        : mCore(inLimits, std::move(inHandler), std::move(inLaneOf)), mWork(mCore.io.get_executor()) {}
 
     std::uint16_t Listen(std::string const& inAddress, std::uint16_t inPort,
                          std::shared_ptr<asio::ssl::context> inTls) {
@@ -100,7 +101,7 @@ public:
         for (auto const& listener : mListeners)
             listener->Accept();
         for (std::size_t i = 0; i < mCore.limits.ioThreads; ++i)
-            mThreads.emplace_back([this] { mCore.io.run(); });
+            mThreads.emplace_back([this] { RunIo(); });
     }
 
     void Stop() {
@@ -115,8 +116,9 @@ public:
                 mCore.WaitUntilAllEnded(std::chrono::seconds(1));
             }
         }
-        mCore.workers.join();
-        mCore.slowWorker.join();
+        mCore.readers.join();
+        mCore.writers.join();
+        mCore.signIns.join();
         mWork.reset();
         mCore.io.stop();
         for (auto& thread : mThreads)
@@ -126,14 +128,26 @@ public:
     }
 
 private:
+    // What a handler throws (memory is short, say) costs its connection, not the server.
+    void RunIo() {
+        while (true) {
+            try {
+                mCore.io.run();
+                return;
+            } catch (std::exception const& error) {
+                std::cerr << std::string("zohub: a connection was dropped: ") + error.what() + "\n";
+            }
+        }
+    }
+
     ServerCore mCore;
     asio::executor_work_guard<asio::io_context::executor_type> mWork;
     std::vector<std::shared_ptr<Listener>> mListeners;
     std::vector<std::thread> mThreads;
 };
 
-Server::Server(ServerLimits const& inLimits, RequestHandler inHandler, SlowRequestTest inIsSlow)
-    : mImplementation(std::make_shared<Implementation>(inLimits, std::move(inHandler), std::move(inIsSlow))) {
+Server::Server(ServerLimits const& inLimits, RequestHandler inHandler, LaneFunction inLaneOf)
+    : mImplementation(std::make_shared<Implementation>(inLimits, std::move(inHandler), std::move(inLaneOf))) {
 }
 
 Server::~Server() {

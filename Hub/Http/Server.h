@@ -24,17 +24,20 @@ struct ServerLimits {
     std::uint64_t maxBodiesInFlight = 1ull << 30;
     std::size_t maxConnections = 4096;
     std::size_t ioThreads = 2;
-    std::size_t workerThreads = 4;
+    std::size_t readThreads = 4;
+    std::size_t writeThreads = 2;
 };
 
 /// Runs a request to its end and never throws. Called on worker threads, several at a time.
 using RequestHandler = std::function<Response(Request const&)>;
-/// True for requests that are slow on purpose; they have one thread of their own.
-using SlowRequestTest = std::function<bool(Request const&)>;
+/// Which threads run a request. Writes wait for each other in the database, and sign-ins are slow on purpose;
+/// neither may keep readers waiting.
+enum class Lane { Read, Write, SignIn };
+using LaneFunction = std::function<Lane(Request const&)>;
 
 class Server {
 public:
-    Server(ServerLimits const& inLimits, RequestHandler inHandler, SlowRequestTest inIsSlow);
+    Server(ServerLimits const& inLimits, RequestHandler inHandler, LaneFunction inLaneOf);
     /// Stops.
     ~Server();
     Server(Server const&) = delete;

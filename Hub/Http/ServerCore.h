@@ -14,18 +14,19 @@
 namespace zohub {
 
 struct ServerCore {
-    ServerCore(ServerLimits const& inLimits, RequestHandler inHandler, SlowRequestTest inIsSlow)
+    ServerCore(ServerLimits const& inLimits, RequestHandler inHandler, LaneFunction inLaneOf)
         : limits(inLimits),
           handler(std::move(inHandler)),
-          isSlow(std::move(inIsSlow)),
+          laneOf(std::move(inLaneOf)),
           io(static_cast<int>(inLimits.ioThreads)),
-          workers(inLimits.workerThreads),
-          slowWorker(1) {}
+          readers(inLimits.readThreads),
+          writers(inLimits.writeThreads),
+          signIns(1) {}
 
     ServerLimits const limits;
     RequestHandler const handler;
-    SlowRequestTest const isSlow;
-    std::atomic<std::size_t> slowWaiting{0};
+    LaneFunction const laneOf;
+    std::atomic<std::size_t> signInsWaiting{0};
     std::atomic<std::uint64_t> bodyBytes{0};
     std::atomic<bool> isStopping{false};
 
@@ -40,8 +41,9 @@ struct ServerCore {
 
     // Last, so destroyed first: what still waits in them holds connections, which look at the fields above.
     boost::asio::io_context io;
-    boost::asio::thread_pool workers;
-    boost::asio::thread_pool slowWorker;
+    boost::asio::thread_pool readers;
+    boost::asio::thread_pool writers;
+    boost::asio::thread_pool signIns;
 
     bool Register(void const* inConnection, Handle inHandle) {
         std::lock_guard const lock(mutex);
@@ -56,6 +58,10 @@ struct ServerCore {
         connections.erase(inConnection);
         if (connections.empty())
             allEnded.notify_all();
+    }
+
+    boost::asio::thread_pool& PoolOf(Lane inLane) {
+        return inLane == Lane::Read ? readers : inLane == Lane::Write ? writers : signIns;
     }
 
     /// Asks every connection, outside of the lock.

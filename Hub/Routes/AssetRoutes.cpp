@@ -77,11 +77,8 @@ Response ListAssets(Call& ioCall, bool inIsPinned, bool inIsFull) {
     if (ioCall.HasCurrent(tag))
         return response;
     response.contentType = kJsonType;
-    response.body = ioCall.cache.Find(state);
-    if (!response.body) {
-        response.body = std::make_shared<Body const>(WriteList(ioCall, view, inIsFull, tail, parent));
-        ioCall.cache.Put(state, response.body);
-    }
+    response.body =
+        ioCall.cache.FindOrMake(state, [&] { return WriteList(ioCall, view, inIsFull, tail, parent); });
     return response;
 }
 

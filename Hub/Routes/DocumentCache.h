@@ -2,6 +2,8 @@
 // client.
 #pragma once
 
+#include <functional>
+#include <future>
 #include <list>
 #include <memory>
 #include <mutex>
@@ -18,10 +20,15 @@ class DocumentCache {
 public:
     explicit DocumentCache(std::size_t inMaxBytes) : mMaxBytes(inMaxBytes) {}
 
-    std::shared_ptr<Body const> Find(std::string const& inKey);
-    void Put(std::string const& inKey, std::shared_ptr<Body const> inBody);
+    /// Makes the body when it is not here. Of several that ask at the same time one makes it and the others
+    /// wait; what the maker throws reaches all of them.
+    std::shared_ptr<Body const> FindOrMake(std::string const& inKey,
+                                           std::function<std::string()> const& inMake);
 
 private:
+    using Shared = std::shared_ptr<Body const>;
+    void Keep(std::string const& inKey, Shared const& inBody);
+
     struct Entry {
         std::string key;
         std::shared_ptr<Body const> body;
@@ -30,6 +37,7 @@ private:
     std::mutex mMutex;
     std::list<Entry> mEntries;  // under mMutex, most recently used first
     std::unordered_map<std::string, std::list<Entry>::iterator> mByKey;
+    std::unordered_map<std::string, std::shared_future<Shared>> mInTheMaking;
     std::size_t mBytes = 0;
 };
 

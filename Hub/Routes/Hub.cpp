@@ -137,8 +137,11 @@ Hub::Hub(Storage& inStorage, HubSettings inSettings, Clock inClock)
 
 Hub::~Hub() = default;
 
-bool Hub::IsSlow(Request const& inRequest) {
-    return inRequest.method == "POST" && JoinedPath(inRequest) == kLoginSegments;
+Lane Hub::LaneOf(Request const& inRequest) {
+    if (inRequest.IsRead())
+        return Lane::Read;
+    bool const isSignIn = inRequest.method == "POST" && JoinedPath(inRequest) == kLoginSegments;
+    return isSignIn ? Lane::SignIn : Lane::Write;
 }
 
 Hub::Match Hub::FindRoute(Request const& inRequest) const {
@@ -185,7 +188,7 @@ Response Hub::Handle(Request const& inRequest) {
 }
 
 Response Hub::Run(Request const& inRequest) {
-    if (IsSlow(inRequest))
+    if (LaneOf(inRequest) == Lane::SignIn)
         return SignInByForm(inRequest, mStorage, mSettings, mClock());
     return RunRoute(inRequest, FindRoute(inRequest));
 }

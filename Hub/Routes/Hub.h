@@ -8,6 +8,7 @@
 
 #include "Base/Clock.h"
 #include "Http/Message.h"
+#include "Http/Server.h"
 #include "Model/Repository.h"
 #include "Routes/DocumentCache.h"
 #include "Store/Storage.h"
@@ -59,8 +60,7 @@ public:
 
     /// Runs the request inside one transaction. What is refused or fails is undone and answered as JSON.
     Response Handle(Request const& inRequest);
-    /// Sign-ins: slow on purpose.
-    static bool IsSlow(Request const& inRequest);
+    static Lane LaneOf(Request const& inRequest);
 
 private:
     struct Match;

@@ -191,7 +191,7 @@ TEST(SlowClients, AreCutWhileOthersAreServedAtOnce) {
     ServerLimits limits;
     limits.header = milliseconds(300);
     limits.bodyGrace = milliseconds(300);
-    limits.workerThreads = 2;
+    limits.readThreads = 2;
     RunningHub hub(limits);
     std::vector<std::unique_ptr<RawConnection>> slow;
     for (int i = 0; i < 150; ++i) {

@@ -66,7 +66,7 @@ RunningHub::RunningHub(ServerLimits const& inLimits)
     settings.tokenLifetime = 3600 * kSecond;
     mHub = std::make_unique<Hub>(*mStorage, settings, [this] { return mNow.load(); });
     mServer = std::make_unique<Server>(
-        inLimits, [this](Request const& inRequest) { return mHub->Handle(inRequest); }, Hub::IsSlow);
+        inLimits, [this](Request const& inRequest) { return mHub->Handle(inRequest); }, Hub::LaneOf);
     mPort = mServer->ListenPlain("127.0.0.1", 0);
     mServer->Start();
 }

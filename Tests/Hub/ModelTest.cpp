@@ -1,13 +1,16 @@
 // The asset map against a plain map, and the text forms of objects.
 #include <gtest/gtest.h>
 
+#include <atomic>
 #include <random>
+#include <thread>
 
 #include "Base/Digest.h"
 #include "Base/Error.h"
 #include "Base/Text.h"
 #include "HubFixture.h"
 #include "Model/AssetMap.h"
+#include "Routes/DocumentCache.h"
 
 namespace zohub::test {
 
@@ -92,6 +95,40 @@ TEST(Objects, KeepAllFieldsAndRefuseDamage) {
     for (std::size_t cut = 0; cut < text.find("properties\n"); ++cut)
         EXPECT_THROW(ReadAssetState(text.substr(0, cut)), std::runtime_error) << cut;
     EXPECT_THROW(ReadTreeRoot(text), std::runtime_error);
+}
+
+TEST(DocumentCacheTest, MakesABodyOnceForAllWhoAskAndForgetsTheOldest) {
+    DocumentCache cache(2500);
+    std::atomic<int> made{0};
+    std::vector<std::thread> readers;
+    for (int i = 0; i < 8; ++i)
+        readers.emplace_back([&] {
+            auto const body = cache.FindOrMake("a", [&] {
+                ++made;
+                return std::string(1000, 'a');
+            });
+            EXPECT_EQ(body->Plain(), std::string(1000, 'a'));
+        });
+    for (auto& reader : readers)
+        reader.join();
+    EXPECT_EQ(made, 1);
+    auto const makes = [&](std::string const& inKey, std::size_t inSize) {
+        bool asked = false;
+        cache.FindOrMake(inKey, [&] {
+            asked = true;
+            return std::string(inSize, 'x');
+        });
+        return asked;
+    };
+    EXPECT_TRUE(makes("b", 1000));
+    EXPECT_FALSE(makes("a", 0));
+    EXPECT_TRUE(makes("c", 1000));
+    EXPECT_TRUE(makes("b", 1000)) << "b was used longest ago";
+    EXPECT_TRUE(makes("huge", 3000));
+    EXPECT_TRUE(makes("huge", 3000));
+    EXPECT_THROW(cache.FindOrMake("bad", []() -> std::string { throw std::runtime_error("no"); }),
+                 std::runtime_error);
+    EXPECT_TRUE(makes("bad", 1));
 }
 
 TEST(TextRules, DecideWhatMayBeANameAndAnIdentifier) {

@@ -1,4 +1,7 @@
 // Productions, templates, copies, commits and conditional requests.
+#include <atomic>
+#include <thread>
+
 #include "HubFixture.h"
 
 namespace zohub::test {
@@ -174,6 +177,45 @@ TEST_F(ProductionTest, ARepeatedRequestWithItsKeyIsAnsweredFromMemoryForADay) {
 TEST_F(ProductionTest, ARefusedRequestLeavesItsKeyFree) {
     EXPECT_EQ(mAnna.PostJson("/zo/1/p", R"({"name":3})", {{"Idempotency-Key", "k2"}}).status, 400);
     EXPECT_EQ(mAnna.PostJson("/zo/1/p", R"({"name":"x"})", {{"Idempotency-Key", "k2"}}).status, 201);
+}
+
+TEST_F(ProductionTest, OfManyWhoWriteAgainstOneTagExactlyOneSucceeds) {
+    Json const production = MakeProduction(mAnna, "Film");
+    std::string const edit = LinkOf(production, "edit");
+    std::string const tag = mAnna.Get(edit).Header("etag");
+    std::atomic<int> done{0};
+    std::atomic<int> refused{0};
+    std::vector<std::thread> writers;
+    for (int i = 0; i < 8; ++i)
+        writers.emplace_back([&, i] {
+            int const status =
+                mAnna.PutJson(edit, "{\"name\":\"by " + std::to_string(i) + "\"}", {{"If-Match", tag}})
+                    .status;
+            ++(status == 200 ? done : refused);
+            EXPECT_TRUE(status == 200 || status == 412) << status;
+        });
+    for (auto& writer : writers)
+        writer.join();
+    EXPECT_EQ(done, 1);
+    EXPECT_EQ(refused, 7);
+}
+
+TEST_F(ProductionTest, ReadersDoNotWaitForWritersThatWait) {
+    Json const production = MakeProduction(mAnna, "Film");
+    std::string const self = LinkOf(production, "self");
+    auto longWrite = mHub.Data().BeginWrite();
+    std::vector<std::thread> writers;
+    for (int i = 0; i < 6; ++i)
+        writers.emplace_back([&] { EXPECT_EQ(mAnna.PutJson(self, R"({"name":"later"})").status, 200); });
+    for (int i = 0; i < 20; ++i) {
+        auto const begin = std::chrono::steady_clock::now();
+        EXPECT_EQ(mAnna.Get(self).status, 200);
+        EXPECT_LT(std::chrono::steady_clock::now() - begin, std::chrono::seconds(2));
+    }
+    longWrite.reset();
+    for (auto& writer : writers)
+        writer.join();
+    EXPECT_EQ(Json::parse(mAnna.Get(self).body)["properties"]["name"], "later");
 }
 
 }  // namespace zohub::test
