@@ -29,6 +29,8 @@ public:
 };
 
 /// What a concrete message derives from: `struct MyMessage : MessageImpl<MyMessage> { ... };`
+/// Types are told apart by their qualified names, so the types that are posted to one station must differ in
+/// them; two of one name in different unnamed namespaces are one type.
 template <class T>
 class MessageImpl : public Message {
 public:

@@ -19,7 +19,8 @@ namespace RFL {
 /// notifier.
 class ZOPLATFORM_EXPORT RegistryChangeNotifier {
 public:
-    /// Null when the platform cannot watch the directory of the store.
+    /// Null when the path cannot be a key's, or the platform cannot watch the directory of the store. Makes
+    /// the user's directory when it is missing.
     static shared_ptr<RegistryChangeNotifier> Create(RegistryRoot inRoot, const UString& inPath,
                                                      function<void()> inOnChanged);
     ~RegistryChangeNotifier();
