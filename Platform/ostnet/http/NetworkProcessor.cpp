@@ -65,10 +65,11 @@ public:
         : mSettings(std::move(inSettings)),
           mWorkers(kWorkerCount, [this](Job& ioJob) { Run(ioJob); }),
           mDelayed(std::make_shared<DelayedFunctions>([this](function<void()> inWork) { PostWork(inWork); })),
-          mNetwork([this](NetworkThread::Exchanges& ioEnded) { PostEnded(ioEnded); },
-                   [this](const std::shared_ptr<Exchange>& inExchange) {
-                       mWorkers.Post({Job::Kind::kProgress, inExchange, {}});
-                   },
+          mNetwork({[this](NetworkThread::Exchanges& ioEnded) { PostEnded(ioEnded); },
+                    [this](const std::shared_ptr<Exchange>& inExchange) {
+                        mWorkers.Post({Job::Kind::kProgress, inExchange, {}});
+                    },
+                    [this] { return mWorkers.MayStall(); }, [this] { mWorkers.WakeOne(); }},
                    mSettings()->limits.maximumConnections) {}
 
     bool Start(Request inRequest, const Headers& inHeaders, const CompletionFunction& inCompletion);

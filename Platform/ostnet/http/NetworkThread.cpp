@@ -4,6 +4,7 @@
 #include <openssl/ssl.h>
 #include <sys/epoll.h>
 #include <sys/eventfd.h>
+#include <sys/socket.h>
 #include <unistd.h>
 
 #include <array>
@@ -19,6 +20,7 @@ using ostcore::threads::MutexLock;
 
 constexpr std::size_t kMostIdleHandles = 64;
 constexpr std::size_t kEventsAtOnce = 128;
+constexpr int kPatienceWithWorkers = 1;
 constexpr long kReceiveBufferSize = 64 << 10;
 constexpr std::chrono::milliseconds kSlowestSweep(1000);
 constexpr std::chrono::milliseconds kFastestSweep(20);
@@ -94,9 +96,8 @@ void Prepare(CURL* ioHandle, const NetworkSettings& inSettings) {
 
 }  // namespace
 
-NetworkThread::NetworkThread(Ended inEnded, Progressed inProgressed, std::uint32_t inMostTransfers)
-    : mEnded(std::move(inEnded)),
-      mProgressed(std::move(inProgressed)),
+NetworkThread::NetworkThread(Workers inWorkers, std::uint32_t inMostTransfers)
+    : mWorkers(std::move(inWorkers)),
       mMostTransfers(std::max(inMostTransfers, 1u)),
       mSweepEvery(kSlowestSweep) {
     if (OpenEngine()) {
@@ -185,7 +186,7 @@ void NetworkThread::Run() {
         CheckDeadlines();
         BeginWaiting();
         if (!mEndedExchanges.empty()) {
-            mEnded(mEndedExchanges);
+            mWorkers.takeEnded(mEndedExchanges);
             mEndedExchanges.clear();
         }
     }
@@ -217,17 +218,28 @@ int NetworkThread::MillisecondsToNextTimer(Clock::time_point inNow) const {
 
 void NetworkThread::WaitForEvents() {
     std::array<epoll_event, kEventsAtOnce> events;
-    const int wait = MayFallAsleep() ? MillisecondsToNextTimer(Clock::now()) : 0;
+    int wait = MayFallAsleep() ? MillisecondsToNextTimer(Clock::now()) : 0;
+    const bool mustLookAfterWorkers = wait != 0 && mWorkers.mayStall();
+    if (mustLookAfterWorkers) {
+        wait = kPatienceWithWorkers;
+    }
     const int count = epoll_wait(mEpoll, events.data(), static_cast<int>(events.size()), wait);
     {
         MutexLock lock(mMutex);
         mIsAsleep = false;
+    }
+    if (mustLookAfterWorkers && count == 0) {
+        mWorkers.wakeOne();
     }
     for (int i = 0; i < count; ++i) {
         const epoll_event& event = events[static_cast<std::size_t>(i)];
         if (event.data.fd == mWakeUp) {
             std::uint64_t wakes = 0;
             [[maybe_unused]] const auto size = read(mWakeUp, &wakes, sizeof wakes);
+            continue;
+        }
+        if (SocketOf(event.data.fd).wanted == 0) {
+            Watch(event.data.fd, 0);
             continue;
         }
         int running = 0;
@@ -363,6 +375,10 @@ NetworkThread::IdleHandle NetworkThread::TakeHandle(const shared_ptr<NetworkSett
     if (idle.handle && idle.preparedFor != inSettings) {
         curl_easy_reset(idle.handle);
         Prepare(idle.handle, *inSettings);
+        curl_easy_setopt(idle.handle, CURLOPT_OPENSOCKETFUNCTION, &NetworkThread::OnOpenSocket);
+        curl_easy_setopt(idle.handle, CURLOPT_OPENSOCKETDATA, this);
+        curl_easy_setopt(idle.handle, CURLOPT_CLOSESOCKETFUNCTION, &NetworkThread::OnCloseSocket);
+        curl_easy_setopt(idle.handle, CURLOPT_CLOSESOCKETDATA, this);
         idle.preparedFor = inSettings;
     }
     return idle;
@@ -390,20 +406,52 @@ void NetworkThread::CloseAll() {
     }
 }
 
-int NetworkThread::OnSocketChange(CURL*, curl_socket_t inSocket, int inWhat, void* inThis, void* inSeen) {
+/// A kept connection stays in the event queue between two transfers, since it is most often wanted again at
+/// once. It leaves the queue when it has news that nobody wants, and when the engine closes it.
+int NetworkThread::OnSocketChange(CURL*, curl_socket_t inSocket, int inWhat, void* inThis, void*) {
     auto& self = *static_cast<NetworkThread*>(inThis);
+    Socket& socket = self.SocketOf(inSocket);
+    socket.wanted = inWhat == CURL_POLL_REMOVE ? 0u : EventsOf(inWhat);
+    if (socket.wanted == 0 ? !socket.isConnection : socket.wanted != socket.watched) {
+        self.Watch(inSocket, socket.wanted);
+    }
+    return 0;
+}
+
+/// Has the event queue look for these events; for none, it forgets the socket.
+void NetworkThread::Watch(int inSocket, std::uint32_t inEvents) {
+    Socket& socket = SocketOf(inSocket);
     epoll_event event{};
     event.data.fd = inSocket;
-    if (inWhat == CURL_POLL_REMOVE) {
-        epoll_ctl(self.mEpoll, EPOLL_CTL_DEL, inSocket, &event);
-        return 0;
+    event.events = inEvents;
+    if (inEvents == 0) {
+        epoll_ctl(mEpoll, EPOLL_CTL_DEL, inSocket, &event);
+    } else if (epoll_ctl(mEpoll, socket.watched != 0 ? EPOLL_CTL_MOD : EPOLL_CTL_ADD, inSocket, &event) !=
+               0) {
+        epoll_ctl(mEpoll, socket.watched != 0 ? EPOLL_CTL_ADD : EPOLL_CTL_MOD, inSocket, &event);
     }
-    event.events = EventsOf(inWhat);
-    if (epoll_ctl(self.mEpoll, inSeen ? EPOLL_CTL_MOD : EPOLL_CTL_ADD, inSocket, &event) != 0) {
-        epoll_ctl(self.mEpoll, inSeen ? EPOLL_CTL_ADD : EPOLL_CTL_MOD, inSocket, &event);
+    socket.watched = inEvents;
+}
+
+NetworkThread::Socket& NetworkThread::SocketOf(int inSocket) {
+    const auto index = static_cast<std::size_t>(inSocket);
+    if (index >= mSockets.size()) {
+        mSockets.resize(index + 1);
     }
-    curl_multi_assign(self.mMulti, inSocket, &self);  // marks the socket as seen
-    return 0;
+    return mSockets[index];
+}
+
+curl_socket_t NetworkThread::OnOpenSocket(void* inThis, curlsocktype, curl_sockaddr* inAddress) {
+    const int opened = socket(inAddress->family, inAddress->socktype | SOCK_CLOEXEC, inAddress->protocol);
+    if (opened >= 0) {
+        static_cast<NetworkThread*>(inThis)->SocketOf(opened) = {true, 0, 0};
+    }
+    return opened;
+}
+
+int NetworkThread::OnCloseSocket(void* inThis, curl_socket_t inSocket) {
+    static_cast<NetworkThread*>(inThis)->SocketOf(inSocket) = {};
+    return close(inSocket);
 }
 
 int NetworkThread::OnTimerChange(CURLM*, long inMilliseconds, void* inThis) {
@@ -421,7 +469,7 @@ int NetworkThread::OnTransferProgress(void* inTransfer, curl_off_t inReceiveTota
     };
     if (transfer.exchange->NoteProgress(number(inSent), number(inSendTotal), number(inReceived),
                                         number(inReceiveTotal))) {
-        transfer.owner->mProgressed(transfer.exchange);
+        transfer.owner->mWorkers.takeProgress(transfer.exchange);
     }
     return 0;
 }

@@ -22,16 +22,24 @@ namespace http {
 /// Orders (begin, drop) come in from any thread through a list; only when the thread sleeps does an order
 /// wake it, so that a busy thread takes many orders for one look at the list. Ended transfers leave in
 /// batches, on the network thread. Only so many transfers run at a time; the others wait here in their order,
-/// since the engine's own queue costs a look at all of it for each transfer that ends. A dropped exchange is not handed over.
+/// since the engine's own queue costs a look at all of it for each transfer that ends. A dropped exchange is
+/// not handed over.
 class NetworkThread {
 public:
     using Exchanges = std::vector<std::shared_ptr<Exchange>>;
-    /// Takes the exchanges whose transfer has ended; runs on the network thread and must not block.
-    using Ended = std::function<void(Exchanges& ioEnded)>;
-    /// An exchange whose observer has something to hear, likewise.
-    using Progressed = std::function<void(const std::shared_ptr<Exchange>&)>;
+    /// The side of the workers, called on the network thread; none of it may block.
+    struct Workers {
+        /// Takes the exchanges whose transfer has ended.
+        std::function<void(Exchanges& ioEnded)> takeEnded;
+        /// Takes an exchange whose observer has something to hear.
+        std::function<void(const std::shared_ptr<Exchange>&)> takeProgress;
+        /// True while jobs wait for a busy worker and another one sleeps. The network thread then looks again
+        /// in a moment, and wakes one if the jobs still wait: that is cheaper than a wake-up for each batch.
+        std::function<bool()> mayStall;
+        std::function<void()> wakeOne;
+    };
 
-    NetworkThread(Ended inEnded, Progressed inProgressed, std::uint32_t inMostTransfers);
+    NetworkThread(Workers inWorkers, std::uint32_t inMostTransfers);
     ~NetworkThread();
     NetworkThread(const NetworkThread&) = delete;
     NetworkThread& operator=(const NetworkThread&) = delete;
@@ -54,6 +62,11 @@ private:
         NetworkThread* owner = nullptr;
         std::shared_ptr<Exchange> exchange;
         shared_ptr<NetworkSettings const> preparedFor;
+    };
+    struct Socket {
+        bool isConnection = false;
+        std::uint32_t wanted = 0;   // by the engine
+        std::uint32_t watched = 0;  // by the event queue
     };
     struct IdleHandle {
         CURL* handle;
@@ -80,13 +93,17 @@ private:
     void Wake() noexcept;
     void CloseAll();
 
+    void Watch(int inSocket, std::uint32_t inEvents);
+    Socket& SocketOf(int inSocket);
+
+    static curl_socket_t OnOpenSocket(void* inThis, curlsocktype inPurpose, curl_sockaddr* inAddress);
+    static int OnCloseSocket(void* inThis, curl_socket_t inSocket);
     static int OnSocketChange(CURL* inHandle, curl_socket_t inSocket, int inWhat, void* inThis, void* inSeen);
     static int OnTimerChange(CURLM* inMulti, long inMilliseconds, void* inThis);
     static int OnTransferProgress(void* inTransfer, curl_off_t inReceiveTotal, curl_off_t inReceived,
                                   curl_off_t inSendTotal, curl_off_t inSent);
 
-    const Ended mEnded;
-    const Progressed mProgressed;
+    const Workers mWorkers;
 
     ostcore::threads::Mutex mMutex;
     Orders mOrders ZO_GUARDED_BY(mMutex);
@@ -100,6 +117,7 @@ private:
     int mWakeUp = -1;
     std::unordered_map<CURL*, Transfer> mTransfers;
     std::deque<std::shared_ptr<Exchange>> mWaiting;
+    std::vector<Socket> mSockets;
     std::vector<IdleHandle> mIdleHandles;
     Exchanges mEndedExchanges;
     bool mHasEngineTimer = false;

@@ -97,14 +97,22 @@ bool WorkerPool::PostAll(std::vector<Job>& ioJobs) {
         return false;
     }
     std::move(ioJobs.begin(), ioJobs.end(), std::back_inserter(mState->jobs));
-    // One is woken; it wakes the next when it finds more than it takes.
-    const bool wake = mState->idle > 0 && !ioJobs.empty();
+    const bool wake = mState->idle == mState->running && !ioJobs.empty();
     lock.Unlock();
     ioJobs.clear();
     if (wake) {
         mState->hasWork.NotifyOne();
     }
     return true;
+}
+
+bool WorkerPool::MayStall() const noexcept {
+    MutexLock lock(mState->mutex);
+    return !mState->jobs.empty() && mState->idle > 0;
+}
+
+void WorkerPool::WakeOne() {
+    mState->hasWork.NotifyOne();
 }
 
 /// Waits for a job; false when this worker is to end: the pool is stopped and empty, or the job for whose
@@ -127,11 +135,6 @@ bool WorkerPool::NextJob(State& ioState, Job& outJob) {
     }
     outJob = std::move(ioState.jobs.front());
     ioState.jobs.pop_front();
-    const bool wakeNext = !ioState.jobs.empty() && ioState.idle > 0;
-    lock.Unlock();
-    if (wakeNext) {
-        ioState.hasWork.NotifyOne();
-    }
     return true;
 }
 

@@ -39,8 +39,12 @@ public:
 
     /// False after Stop: the job is dropped.
     bool Post(Job inJob);
-    /// Moves all jobs out of the list.
+    /// Moves all jobs out of the list. A worker is woken only when all sleep: one that works comes to these
+    /// jobs by itself. The caller looks after the case that it does not come (MayStall, WakeOne).
     bool PostAll(std::vector<Job>& ioJobs);
+    /// True while jobs wait and a worker sleeps.
+    bool MayStall() const noexcept;
+    void WakeOne();
     bool IsWorker() const noexcept;
     /// False when no other worker can be had.
     bool AboutToBlock();
