@@ -15,6 +15,10 @@
 
 namespace ZOCL {
 
+// Declared before their own header when that is the one that led here.
+class IZOCProduction;
+class IZOCProductionList;
+
 /// Names a production at a commit; an empty commit stands for the newest.
 struct ProductionRevision {
     ImmutableString productionID;
