@@ -341,7 +341,7 @@ int RegistryKey::DeleteValue(const UString& inName) {
     if (!IsValid() || !IsGoodName(name)) {
         return kResultRegistryBadName;
     }
-    return Write(mRoot, mAccess, [&](RegistryConnection& inConnection) {
+    const int deleted = Write(mRoot, mAccess, [&](RegistryConnection& inConnection) {
         Value value;
         const int found = ReadValue(inConnection, mPath, name, value);
         if (found != kResultSuccess && found != kResultRegistryDamaged) {
@@ -350,6 +350,7 @@ int RegistryKey::DeleteValue(const UString& inName) {
         const int result = RemoveValue(inConnection, mPath, name);
         return result == kResultSuccess ? TouchKey(inConnection, mPath) : result;
     });
+    return EraseAfter(deleted);
 }
 
 int RegistryKey::DeleteSubKey(const UString& inName) {
@@ -357,7 +358,7 @@ int RegistryKey::DeleteSubKey(const UString& inName) {
     if (!IsValid() || !NormaliseRegistryPath(ToUTF16(mPath) + u"\\" + inName, path) || path == mPath) {
         return kResultRegistryBadName;
     }
-    return Write(mRoot, mAccess, [&](RegistryConnection& inConnection) {
+    const int deleted = Write(mRoot, mAccess, [&](RegistryConnection& inConnection) {
         int result = FindKey(inConnection, path);
         // What lies below begins with the path and a backslash, and so comes before the path and a ']'.
         const std::string first = path + "\\";
@@ -370,6 +371,23 @@ int RegistryKey::DeleteSubKey(const UString& inName) {
         }
         return result == kResultSuccess ? TouchKey(inConnection, mPath) : result;
     });
+    return EraseAfter(deleted);
+}
+
+int RegistryKey::EraseOldData() {
+    if (mAccess != RegistryAccess::ReadWrite) {
+        return kResultRegistryReadOnly;
+    }
+    LentConnection connection;
+    const int result = connection.Acquire(mRoot, Mode::ReadWrite);
+    return result == kResultSuccess ? connection->EmptyLog() : result;
+}
+
+int RegistryKey::EraseAfter(int inDeleted) {
+    if (inDeleted == kResultSuccess) {
+        EraseOldData();
+    }
+    return inDeleted;
 }
 
 int RegistryKey::EnumerateSubKeys(std::vector<UString>& outNames) const {
@@ -421,7 +439,8 @@ int RegistryKey::Apply(const std::vector<RegistryChange>& inChanges) {
 }
 
 int RegistryKey::DeleteStringValueIf(const UString& inName, const UString& inExpected) {
-    return Apply({RegistryChange::ExpectString(inName, inExpected), RegistryChange::Delete(inName)});
+    return EraseAfter(
+        Apply({RegistryChange::ExpectString(inName, inExpected), RegistryChange::Delete(inName)}));
 }
 
 int RegistryKey::IncrementUInt32Value(const UString& inName, std::uint32_t inStep, std::uint32_t& outValue) {

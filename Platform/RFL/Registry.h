@@ -104,17 +104,22 @@ public:
     int SetUInt32Value(const UString& inName, std::uint32_t inValue);
     int SetBooleanValue(const UString& inName, bool inValue);
 
-    /// kResultRegistryMissing when there was no such value.
+    /// kResultRegistryMissing when there was no such value. What was deleted is also erased from the files
+    /// (EraseOldData); a store that is too busy for that does not make the deletion fail.
     int DeleteValue(const UString& inName);
-    /// Deletes a key below this one with all that it holds.
+    /// Deletes a key below this one with all that it holds, and erases it as DeleteValue does.
     int DeleteSubKey(const UString& inName);
+    /// Erases from the files what deleted and replaced values have left in them. Waits for readers and
+    /// writers until the time limit; kResultRegistryBusy when they did not let it.
+    int EraseOldData();
     /// The names of the keys directly below, sorted by their UTF-8 bytes.
     int EnumerateSubKeys(std::vector<UString>& outNames) const;
     int EnumerateValues(std::vector<UString>& outNames) const;
 
     /// All changes as one transaction, in order; kResultRegistryChanged when a condition did not hold.
     int Apply(const std::vector<RegistryChange>& inChanges);
-    /// Deletes a string value if it still has this text; kResultRegistryChanged when it has another.
+    /// Deletes a string value, as DeleteValue does, if it still has this text; kResultRegistryChanged when it
+    /// has another.
     int DeleteStringValueIf(const UString& inName, const UString& inExpected);
     /// Adds to a number, an absent one being 0, and gives the sum; it wraps at 32 bits.
     int IncrementUInt32Value(const UString& inName, std::uint32_t inStep, std::uint32_t& outValue);
@@ -125,6 +130,7 @@ public:
 
 private:
     friend class RegistryChangeNotifier;
+    int EraseAfter(int inDeleted);
     RegistryRoot mRoot = RegistryRoot::User;
     RegistryAccess mAccess = RegistryAccess::Read;
     /// Normalised UTF-8, parts joined by backslashes.

@@ -253,7 +253,8 @@ int RegistryConnection::Configure(RegistryRoot inRoot) {
     int result = CheckIdentity(inRoot);
     if (result == kResultSuccess && mCanWrite) {
         // A killed process loses nothing in this mode; a power cut can lose the last moments, not the file.
-        result = Execute("PRAGMA synchronous=NORMAL");
+        // Deleted text is overwritten, since it can be a token.
+        result = Execute("PRAGMA synchronous=NORMAL; PRAGMA secure_delete=ON");
     }
     return result;
 }
@@ -347,6 +348,11 @@ void RegistryConnection::StartClock() {
 std::int64_t RegistryConnection::DataVersion() {
     std::int64_t version = -1;
     return ReadNumber(*this, "PRAGMA data_version", version) == kResultSuccess ? version : -1;
+}
+
+int RegistryConnection::EmptyLog() {
+    return ResultOfCode(
+        sqlite3_wal_checkpoint_v2(mDatabase, nullptr, SQLITE_CHECKPOINT_TRUNCATE, nullptr, nullptr));
 }
 
 bool RegistryConnection::IsStillTheFile() const {

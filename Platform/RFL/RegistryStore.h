@@ -70,6 +70,8 @@ public:
     void StartClock();
     /// Changes each time another connection has changed the file. Negative when it cannot be read.
     std::int64_t DataVersion();
+    /// Takes all that was committed into the file itself and empties the log beside it.
+    int EmptyLog();
     /// False when the file at the path is no longer the one that was opened.
     bool IsStillTheFile() const;
     bool CanWrite() const noexcept { return mCanWrite; }

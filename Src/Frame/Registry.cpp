@@ -249,6 +249,8 @@ bool StoreLoginData(const ZOLoginData& inData, const UString& inSubKey) {
                               RFL::RegistryChange::SetString(kLastToken, ToUTF16(inData.token.view()))}))) {
         return false;
     }
+    // The former token must not stay behind in the files.
+    key.EraseOldData();
     Memory& memory = TheMemory();
     ScopedLock lock(memory.mutex, "ZOCL::Registry::StoreLoginData");
     memory.latestExpectedAuthToken = inData.token;
