@@ -28,6 +28,8 @@ using PlainStream = beast::tcp_stream;
 using TlsStream = beast::ssl_stream<beast::tcp_stream>;
 
 constexpr std::size_t kWriteStep = 256 * 1024;
+// A body up to here leaves in one piece with its head.
+constexpr std::size_t kJoinUpTo = 8 * 1024;
 constexpr std::size_t kPackFrom = 1024;
 constexpr std::size_t kMaxSignInsWaiting = 64;
 constexpr std::size_t kMaxDrained = 4 << 20;
@@ -289,13 +291,15 @@ private:
         mOutgoing = std::move(inOutgoing);
         mWritten = 0;
         Lowest().expires_at(Deadline(0));
-        std::size_t const first = mOutgoing.body ? std::min(kWriteStep, mOutgoing.body->size()) : 0;
-        std::array<asio::const_buffer, 2> const buffers{
-            asio::buffer(mOutgoing.head),
-            first ? asio::buffer(mOutgoing.body->data(), first) : asio::const_buffer()};
-        asio::async_write(mStream, buffers, [self = Self(), first](beast::error_code inError, std::size_t) {
-            self->OnWritten(inError, first);
-        });
+        std::size_t const size = mOutgoing.body ? mOutgoing.body->size() : 0;
+        std::size_t const joined = size <= kJoinUpTo ? size : 0;
+        if (joined > 0)
+            mOutgoing.head.append(*mOutgoing.body);
+        // One buffer a write: the secure stream reports a sequence as written when its first part is.
+        asio::async_write(mStream, asio::buffer(mOutgoing.head),
+                          [self = Self(), joined](beast::error_code inError, std::size_t) {
+                              self->OnWritten(inError, joined);
+                          });
     }
 
     void OnWritten(beast::error_code inError, std::size_t inCount) {
