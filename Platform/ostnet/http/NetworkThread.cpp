@@ -21,7 +21,11 @@ using ostcore::threads::MutexLock;
 constexpr std::size_t kMostIdleHandles = 64;
 constexpr std::size_t kEventsAtOnce = 128;
 constexpr int kPatienceWithWorkers = 1;
-constexpr long kReceiveBufferSize = 64 << 10;
+constexpr std::size_t kEndedAtOnce = 16;
+constexpr std::size_t kManyTransfers = 8;
+constexpr std::chrono::microseconds kLingerFor(200);
+/// Below the size from which the allocator tidies up at each release: the engine takes one per transfer.
+constexpr long kReceiveBufferSize = 32 << 10;
 constexpr std::chrono::milliseconds kSlowestSweep(1000);
 constexpr std::chrono::milliseconds kFastestSweep(20);
 
@@ -185,10 +189,6 @@ void NetworkThread::Run() {
         CollectEnded();
         CheckDeadlines();
         BeginWaiting();
-        if (!mEndedExchanges.empty()) {
-            mWorkers.takeEnded(mEndedExchanges);
-            mEndedExchanges.clear();
-        }
     }
     mWaiting.clear();
     while (!mTransfers.empty()) {
@@ -216,15 +216,47 @@ int NetworkThread::MillisecondsToNextTimer(Clock::time_point inNow) const {
     return left <= 0 ? 0 : static_cast<int>(std::min<long long>(left, 60000));
 }
 
+void NetworkThread::HandOverEnded() {
+    if (!mEndedExchanges.empty()) {
+        mWorkers.takeEnded(mEndedExchanges);
+        mEndedExchanges.clear();
+    }
+}
+
+/// With many transfers under way, what has ended waits a moment for others that end: one wake-up of a worker,
+/// and one of this thread for what the worker then starts, serve them all. Orders wait for that moment, too.
+bool NetworkThread::MayLinger(Clock::time_point inNow) {
+    if (mEndedExchanges.empty() || mTransfers.size() < kManyTransfers ||
+        mEndedExchanges.size() >= kEndedAtOnce) {
+        mIsLingering = false;
+        return false;
+    }
+    if (!std::exchange(mIsLingering, true)) {
+        mLingerUntil = inNow + kLingerFor;
+    }
+    mIsLingering = inNow < mLingerUntil;
+    return mIsLingering;
+}
+
 void NetworkThread::WaitForEvents() {
     std::array<epoll_event, kEventsAtOnce> events;
-    int wait = MayFallAsleep() ? MillisecondsToNextTimer(Clock::now()) : 0;
-    const bool mustLookAfterWorkers = wait != 0 && mWorkers.mayStall();
-    if (mustLookAfterWorkers) {
-        wait = kPatienceWithWorkers;
-    }
-    const int count = epoll_wait(mEpoll, events.data(), static_cast<int>(events.size()), wait);
-    {
+    const auto now = Clock::now();
+    int count = 0;
+    bool mustLookAfterWorkers = false;
+    if (MayLinger(now)) {
+        const timespec rest{0, std::chrono::nanoseconds(mLingerUntil - now).count()};
+        count = epoll_pwait2(mEpoll, events.data(), static_cast<int>(events.size()), &rest, nullptr);
+        if (count < 0) {
+            HandOverEnded();  // a kernel without this call does not linger
+        }
+    } else {
+        HandOverEnded();
+        int wait = MayFallAsleep() ? MillisecondsToNextTimer(now) : 0;
+        mustLookAfterWorkers = wait != 0 && mWorkers.mayStall();
+        if (mustLookAfterWorkers) {
+            wait = kPatienceWithWorkers;
+        }
+        count = epoll_wait(mEpoll, events.data(), static_cast<int>(events.size()), wait);
         MutexLock lock(mMutex);
         mIsAsleep = false;
     }

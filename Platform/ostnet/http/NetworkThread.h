@@ -77,6 +77,8 @@ private:
     bool OpenEngine();
     bool MayFallAsleep();
     void WaitForEvents();
+    bool MayLinger(Clock::time_point inNow);
+    void HandOverEnded();
     bool TakeOrders();
     void RunEngineTimer();
     void CollectEnded();
@@ -120,6 +122,8 @@ private:
     std::vector<Socket> mSockets;
     std::vector<IdleHandle> mIdleHandles;
     Exchanges mEndedExchanges;
+    bool mIsLingering = false;
+    Clock::time_point mLingerUntil;
     bool mHasEngineTimer = false;
     Clock::time_point mEngineTimer;
     Clock::time_point mNextSweep;
