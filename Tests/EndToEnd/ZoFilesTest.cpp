@@ -90,7 +90,7 @@ TEST(FileNames, AreMadeOfAssetNames) {
     EXPECT_EQ(RenditionFileName("anna.mov", "image/png"), "anna.mov.png");
     EXPECT_EQ(EnclosureFileName("gulls.jpg", "1-2", "1-2_xmp"), "gulls.jpg.xmp");
     EXPECT_EQ(EnclosureFileName("gulls.jpg", "1-2", "notes"), "gulls.jpg.notes");
-    for (const std::string& hostile : {"../../x", "/etc/passwd", "..", "a/../b", "a\\b"}) {
+    for (const std::string hostile : {"../../x", "/etc/passwd", "..", "a/../b", "a\\b"}) {
         for (const std::string& name :
              {RenditionFileName(hostile, "../" + hostile), EnclosureFileName("a", "", hostile),
               EnclosureFileName(hostile, "", "n")}) {

@@ -31,7 +31,7 @@ class Failures(EndToEndTest):
                       ["login", "--server", "https://host", "--user", "ada", "--plain"],
                       ["login", "--server", "http://hub.example", "--user", "ada", "--password-stdin"],
                       ["login", "--server", "https://host", "--user", "ada"]):
-            result = self.ends(ada.zo(*words, "--json"), USAGE)
+            result = self.ends(ada.zo("--json", *words), USAGE)
             self.assertEqual(result.out, b"", words)
             self.assertEqual(result.errors[0]["error"], "usage", words)
         self.assertIn("did you mean 'productions'", ada.zo("produtcions").error_text)

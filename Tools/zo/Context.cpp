@@ -6,6 +6,7 @@
 #include "Failure.h"
 #include "HLM/HLM.h"
 #include "ostcore/config/ClientInfo.h"
+#include "RFL/Registry.h"
 #include "ServerAddress.h"
 #include "StoredToken.h"
 #include "ZOClient/Library.h"
@@ -40,6 +41,8 @@ Library::~Library() {
     mLoop.Drain();
     ZOCL::IZOCDataServer::Terminate(false);
     ZOCL::Shutdown();
+    // The last one to close brings the registry's journal into its file, so that what was deleted is gone.
+    RFL::CloseRegistry();
 }
 
 const Configuration& Context::Settings() {

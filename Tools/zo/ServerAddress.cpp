@@ -42,11 +42,11 @@ bool IsHostCharacter(char inCharacter) {
 
 std::string CompleteServerAddress(const std::string& inText, Scheme inDefault) {
     std::string text = inText;
-    while (!text.empty() && text.back() == '/') {
-        text.pop_back();
-    }
     if (text.find("://") == std::string::npos) {
         text = (inDefault == Scheme::Secure ? kSecure : kPlain) + text;
+    }
+    while (text.back() == '/' && text.size() > text.find("://") + 3) {
+        text.pop_back();
     }
     if (!StartsWith(text, kSecure) && !StartsWith(text, kPlain)) {
         throw BadAddress(inText);
