@@ -1,12 +1,9 @@
 """Passwords and tokens stay where they belong."""
-import os
-import pathlib
 import re
 import stat
-import subprocess
 import unittest
 
-from harness import CANCELLED, MEDIA, NETWORK, NOT_AUTHENTICATED, OK, PARTLY, ZO, EndToEndTest, every_file
+from harness import MEDIA, NOT_AUTHENTICATED, OK, PARTLY, EndToEndTest, every_file
 
 PASSWORD = "canary-Pa55word-7f3e"
 TOKEN = re.compile(rb"login-token=([0-9A-Za-z]{16,})")
@@ -21,8 +18,8 @@ class Secrets(EndToEndTest):
         self.server.start()
         self.ada = self.user()
         self.password = self.ada.password_file(PASSWORD)
-        # Everything that the library can be made to say is said, into a file as well.
-        self.ada.environment["ZOCLIENT_TRACE"] = "8"
+        # Everything that the library can be made to say is said, on standard error.
+        self.ada.environment["ZOCLIENT_TRACE"] = "*:8"
 
     def login(self, *extra):
         return self.ends(self.ada.zo("login", "--server", self.server.url, "--user", "ada", "--password-file",
@@ -47,6 +44,7 @@ class Secrets(EndToEndTest):
     def test_a_whole_session_leaves_the_token_in_the_registry_alone(self):
         self.login("--json")
         secrets = self.token()
+        self.assertIn(b"<ZOCL", self.ada.zo("productions").err, "nothing was traced")
         for words in (["whoami"], ["productions", "--json"], ["open", "Harbour Film"], ["show"], ["assets", "--long"],
                       ["get", "gulls.jpg", "-o", "got/"], ["open", "Missing"], ["login", "--server", self.server.url,
                        "--user", "ada", "--password-stdin"]):
