@@ -19,6 +19,11 @@ ostnet::http::Form MakePayloadForm(const shared_ptr<RecycledMemory const>& inPay
     return {{EnclosurePart(), inPayload ? std::string(inPayload->view()) : std::string()}};
 }
 
+/// A payload of no bytes is held like any other; no payload at all would be asked for again.
+shared_ptr<RecycledMemory const> HeldForm(const shared_ptr<RecycledMemory const>& inPayload) {
+    return inPayload ? inPayload : RecycledMemory::Create(0);
+}
+
 int ResultOfPayloadRequest(int inResult, const shared_ptr<ostnet::Response>& inResponse) {
     if (inResult < 0 || (inResponse && inResponse->IsSuccess())) {
         return inResult;
@@ -81,7 +86,7 @@ bool Enclosure::LoadEnclosureData(const Guid& inRequestID, const RequestCompleti
                                             const shared_ptr<ostnet::Response>& inResponse) {
         const int result = ResultOfPayloadRequest(inResult, inResponse);
         if (result >= 0 && inResponse) {
-            self->KeepPayload(inResponse->payload, "Enclosure::OnGetEnclosurePayloadCompleted");
+            self->KeepPayload(HeldForm(inResponse->payload), "Enclosure::OnGetEnclosurePayloadCompleted");
         }
         if (inCompletion) {
             inCompletion(inID, result, inResource, inResponse);
@@ -106,9 +111,10 @@ shared_ptr<RecycledMemory const> Enclosure::GetEnclosurePayload() {
     if (!response || !response->IsSuccess()) {
         return nullptr;
     }
+    const auto payload = HeldForm(response->payload);
     ScopedLock lock(IZOCDataServer::GetLock(), "Enclosure::GetEnclosurePayload (2)");
     if (!mPayload) {
-        mPayload = response->payload;
+        mPayload = payload;
     }
     return mPayload;
 }
@@ -135,24 +141,24 @@ bool Enclosure::PutEnclosurePayload(const shared_ptr<RecycledMemory const>& inPa
     if (target.empty()) {
         return false;
     }
-    KeepPayload(inPayload, "Enclosure::PutEnclosurePayload");
+    const auto payload = HeldForm(inPayload);
+    KeepPayload(payload, "Enclosure::PutEnclosurePayload");
     const InterfaceRef<Enclosure> self(this);
-    const RequestCompletion onPut = [self, inPayload, inCompletion](
-                                        const Guid& inID, int inResult,
-                                        const InterfaceRef<IZOCServerResource>&,
-                                        const shared_ptr<ostnet::Response>& inResponse) {
-        const int result = ResultOfPayloadRequest(inResult, inResponse);
-        if (result < 0) {
-            self->DropPayload(inPayload, "Enclosure::OnPutEnclosurePayloadCompleted");
-        }
-        if (inCompletion) {
-            inCompletion(inID, result, self, inResponse);
-        }
-    };
+    const RequestCompletion onPut =
+        [self, payload, inCompletion](const Guid& inID, int inResult, const InterfaceRef<IZOCServerResource>&,
+                                      const shared_ptr<ostnet::Response>& inResponse) {
+            const int result = ResultOfPayloadRequest(inResult, inResponse);
+            if (result < 0) {
+                self->DropPayload(payload, "Enclosure::OnPutEnclosurePayloadCompleted");
+            }
+            if (inCompletion) {
+                inCompletion(inID, result, self, inResponse);
+            }
+        };
     const auto resource = ServerResource::MakePlain(target, GetServer(), ResourceWritability::kReadOnly);
     const bool started = resource->PutMultiPart(MakePayloadForm(inPayload), inRequestID, onPut);
     if (!started) {
-        DropPayload(inPayload, "Enclosure::PutEnclosurePayload");
+        DropPayload(payload, "Enclosure::PutEnclosurePayload");
     }
     return started;
 }
@@ -167,7 +173,7 @@ bool Enclosure::PutEnclosurePayload(const shared_ptr<RecycledMemory const>& inPa
     if (!response || !response->IsSuccess()) {
         return false;
     }
-    KeepPayload(inPayload, "Enclosure::PutEnclosurePayload (Synchronous)");
+    KeepPayload(HeldForm(inPayload), "Enclosure::PutEnclosurePayload (Synchronous)");
     return true;
 }
 

@@ -71,6 +71,17 @@ TEST_F(EnclosureTest, PayloadIsFetchedOnceAndKept) {
     EXPECT_EQ(Requests(), 1u);
 }
 
+TEST_F(EnclosureTest, PayloadOfNoBytesIsHeldToo) {
+    const auto x = MakeList({"x"})->GetEnclosure("x");
+    net->Expect("GET", "", ScriptedAnswer::Status(204));
+    Outcome outcome;
+    ASSERT_TRUE(x->LoadEnclosureData(Guid::CreateUnique(), outcome.Function()));
+    EXPECT_EQ(outcome.Wait(), kResultSuccess);
+    EXPECT_TRUE(x->EnclosureDataIsLoaded());
+    EXPECT_EQ(x->GetEnclosurePayload()->size(), 0u);
+    EXPECT_EQ(Requests(), 1u);
+}
+
 TEST_F(EnclosureTest, FailedPayloadLeavesTheMetadata) {
     const auto x = MakeList({"x"})->GetEnclosure("x");
     net->Expect("GET", "", ScriptedAnswer::Status(404));
