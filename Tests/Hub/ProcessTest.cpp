@@ -98,8 +98,9 @@ Result RunZohub(std::vector<std::string> inArguments, std::string const& inInput
     return {code, output};
 }
 
-bool CanSpeakTls(std::uint16_t inPort, std::string const& inCaFile, std::string const& inHost,
-                 std::string& outAnswer) {
+bool CanSpeakTls(
+    std::uint16_t inPort, std::string const& inCaFile, std::string const& inHost, std::string& outAnswer,
+    std::string const& inRequest = "GET /health HTTP/1.1\r\nHost: localhost\r\nConnection: close\r\n\r\n") {
     using Context = std::unique_ptr<SSL_CTX, decltype(&SSL_CTX_free)>;
     Context const context(SSL_CTX_new(TLS_client_method()), SSL_CTX_free);
     SSL_CTX_set_verify(context.get(), SSL_VERIFY_PEER, nullptr);
@@ -116,8 +117,7 @@ bool CanSpeakTls(std::uint16_t inPort, std::string const& inCaFile, std::string 
     BIO_set_conn_hostname(bio.get(), ("127.0.0.1:" + std::to_string(inPort)).c_str());
     if (BIO_do_connect(bio.get()) != 1)
         return false;
-    std::string const request = "GET /health HTTP/1.1\r\nHost: localhost\r\nConnection: close\r\n\r\n";
-    BIO_write(bio.get(), request.data(), static_cast<int>(request.size()));
+    BIO_write(bio.get(), inRequest.data(), static_cast<int>(inRequest.size()));
     char bytes[4096];
     for (int count; (count = BIO_read(bio.get(), bytes, sizeof bytes)) > 0;)
         outAnswer.append(bytes, static_cast<std::size_t>(count));
@@ -291,6 +291,34 @@ TEST_F(ProcessTest, TlsIsTrustedThroughItsOwnAuthorityOnly) {
     EXPECT_EQ(hub->Wait(), 0);
     hub = Serve();
     EXPECT_EQ(ReadFile(mReady["caFile"].get<std::string>()), before) << "clients keep the file they have";
+}
+
+TEST_F(ProcessTest, LongAnswersLeaveWholeOverTls) {
+    ASSERT_EQ(AddUser("anna").code, 0);
+    auto const hub = Serve();
+    Client anna(Port());
+    ASSERT_EQ(anna.SignIn("anna", "anna-secret").status, 200);
+    Json const production = Json::parse(anna.PostJson("/zo/1/p", R"({"name":"Film"})").body);
+    for (std::size_t const size : {100u, 8000u, 9000u, 16384u, 100000u, 1500000u}) {
+        std::string bytes;
+        while (bytes.size() < size)
+            bytes += std::to_string(bytes.size()) + ",";
+        Answer const made = anna.SendForm(
+            "POST", LinkOf(production, "/enclosures"),
+            Form().Add(":name", std::to_string(size)).Add(":enclosure", bytes, "text/x-numbers"));
+        ASSERT_EQ(made.status, 201);
+        std::string const href = LinkOf(Json::parse(made.body), "/enclosures/enclosure");
+        std::string answer;
+        ASSERT_TRUE(CanSpeakTls(
+            PortOf(mReady["tlsUrl"].get<std::string>()), mReady["caFile"].get<std::string>(), "localhost",
+            answer,
+            "GET " + href.substr(href.find("/zo/")) +
+                " HTTP/1.1\r\nHost: localhost\r\nConnection: close\r\nCookie: " + anna.Token() + "\r\n\r\n"));
+        std::size_t const head = answer.find("\r\n\r\n");
+        ASSERT_NE(head, std::string::npos);
+        EXPECT_EQ(answer.size() - head - 4, bytes.size());
+        EXPECT_TRUE(answer.compare(head + 4, std::string::npos, bytes) == 0) << size;
+    }
 }
 
 TEST_F(ProcessTest, CommandLinesThatMakeNoSenseAreRefusedWithoutAPasswordInSight) {
