@@ -14,8 +14,8 @@ public:
     virtual InterfaceRef<IZOCServerResource> MakeResource(const ImmutableString& inURL,
                                                           const InterfaceRef<IZOCDataServer>& inServer,
                                                           ResourceWritability inWritability) = 0;
-    virtual InterfaceRef<IZOCProductionList> MakeProductionList(const ImmutableString& inURL,
-                                                                const InterfaceRef<IZOCDataServer>& inServer) = 0;
+    virtual InterfaceRef<IZOCProductionList> MakeProductionList(
+        const ImmutableString& inURL, const InterfaceRef<IZOCDataServer>& inServer) = 0;
     virtual InterfaceRef<IZOCProduction> MakeProduction(const ImmutableString& inURL,
                                                         const InterfaceRef<IZOCDataServer>& inServer,
                                                         ResourceWritability inWritability) = 0;
@@ -25,7 +25,8 @@ public:
     virtual InterfaceRef<IZOCEnclosures> MakeEnclosures(const ImmutableString& inURL,
                                                         const InterfaceRef<IZOCDataServer>& inServer) = 0;
     /// At the expanded template of the identifier.
-    virtual InterfaceRef<IZOCMediaLocator> MakeMediaLocator(const ImmutableString& inURL, const ImmutableString& inID,
+    virtual InterfaceRef<IZOCMediaLocator> MakeMediaLocator(const ImmutableString& inURL,
+                                                            const ImmutableString& inID,
                                                             const InterfaceRef<IZOCDataServer>& inServer) = 0;
     virtual InterfaceRef<IZOCUser> MakeUser(const ImmutableString& inURL,
                                             const InterfaceRef<IZOCDataServer>& inServer) = 0;

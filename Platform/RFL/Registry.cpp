@@ -4,7 +4,7 @@
 #include <algorithm>
 
 #include "ostcore/utility/StringConversion.h"
-#include "RFL/RegistryStore.h"
+#include "RFL/detail/RegistryStore.h"
 #include "RFL/RFLUnknown.h"
 
 namespace RFL {

@@ -12,9 +12,9 @@
 
 #include "ostcore/threads/MainThread.h"
 #include "ostcore/utility/StringConversion.h"
-#include "RFL/FileChangeWatch.h"
-#include "RFL/RegistryFiles.h"
-#include "RFL/RegistryStore.h"
+#include "RFL/detail/FileChangeWatch.h"
+#include "RFL/detail/RegistryFiles.h"
+#include "RFL/detail/RegistryStore.h"
 #include "RFL/RFLUnknown.h"
 
 namespace RFL {

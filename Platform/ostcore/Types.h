@@ -34,19 +34,19 @@ using U8String = std::string;
 }  // namespace ostcore
 
 // The other namespaces of the house speak of the same types without a prefix.
-#define ZO_USE_BOUNDARY_TYPES              \
-    using ostcore::any;                    \
-    using ostcore::any_cast;               \
-    using ostcore::bad_any_cast;           \
+#define ZO_USE_BOUNDARY_TYPES               \
+    using ostcore::any;                     \
+    using ostcore::any_cast;                \
+    using ostcore::bad_any_cast;            \
     using ostcore::enable_shared_from_this; \
-    using ostcore::function;               \
-    using ostcore::intrusive_ptr;          \
-    using ostcore::make_shared;            \
-    using ostcore::optional;               \
-    using ostcore::ptime;                  \
-    using ostcore::shared_ptr;             \
-    using ostcore::U8String;               \
-    using ostcore::UString;                \
+    using ostcore::function;                \
+    using ostcore::intrusive_ptr;           \
+    using ostcore::make_shared;             \
+    using ostcore::optional;                \
+    using ostcore::ptime;                   \
+    using ostcore::shared_ptr;              \
+    using ostcore::U8String;                \
+    using ostcore::UString;                 \
     using ostcore::weak_ptr;
 
 namespace ostnet {

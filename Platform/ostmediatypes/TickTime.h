@@ -34,7 +34,7 @@ public:
     }
 
     /// The mark of no time at all: the lowest signed 64-bit number.
-    static constexpr std::int64_t kInvalidTicks = std::numeric_limits<std::int64_t>::min();
+    static constexpr std::int64_t kInvalidTicks = (std::numeric_limits<std::int64_t>::min)();
 
 private:
     std::int64_t mTicks = 0;

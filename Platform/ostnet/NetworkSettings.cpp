@@ -5,7 +5,7 @@
 #include "ostcore/config/ClientInfo.h"
 #include "ostcore/debug/DebugDatabase.h"
 #include "ostcore/threads/Mutex.h"
-#include "ostnet/http/HeaderRules.h"
+#include "ostnet/http/detail/HeaderRules.h"
 
 namespace ostnet {
 namespace {

@@ -3,7 +3,7 @@
 #include <curl/curl.h>
 
 #include "ostcore/utility/StringConversion.h"
-#include "ostnet/http/HeaderRules.h"
+#include "ostnet/http/detail/HeaderRules.h"
 
 namespace ostnet {
 namespace {

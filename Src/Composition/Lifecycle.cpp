@@ -6,6 +6,7 @@
 #include "ostcore/threads/MainThread.h"
 #include "ostnet/http/NetworkProcessor.h"
 #include "ResourceFactory.h"
+#include "RFL/Registry.h"
 #include "ZOClient/Library.h"
 
 namespace ZOCL {
@@ -35,6 +36,8 @@ void Shutdown() {
     // The network's last completions still make resources, so the factory goes after it.
     ostnet::Shutdown();
     GetCompositionRoot().resources = nullptr;
+    // Last, since whatever ran until here may have remembered something.
+    RFL::CloseRegistry();
 }
 
 }  // namespace ZOCL

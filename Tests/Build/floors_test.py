@@ -16,7 +16,7 @@ import tempfile
 def floors_in_order(source):
     text = (source / "CMakeLists.txt").read_text()
     declared = re.search(r"zo_declare_floors\(([^)]*)\)", text).group(1).split()
-    return [floor for floor in declared if list((source / "Src" / floor).glob("*.h"))]
+    return [floor for floor in declared if list((source / "Src" / floor).glob("*.cpp"))]
 
 
 def include_flags(database, source, floor):
@@ -45,7 +45,10 @@ def main():
     for index, floor in enumerate(order):
         flags = include_flags(database, source, floor)
         for other_index, other in enumerate(order):
-            header = sorted((source / "Src" / other).glob("*.h"))[0].name
+            headers = sorted((source / "Src" / other).glob("*.h"))
+            if not headers:
+                continue  # all that the floor shows is public
+            header = headers[0].name
             good, errors = compiles(flags, f'#include "{other}/{header}"\n')
             pairs += 1
             if other_index > index and good:
@@ -64,7 +67,7 @@ def main():
         if hub.search(path.read_text()):
             failures.append(f"{path.relative_to(source)} shares code with the client")
     print("\n".join(failures) or f"{len(order)} floors, {pairs} pairs: each includes what it may and no more")
-    return 1 if failures or len(order) < 5 else 0
+    return 1 if failures or len(order) < 7 else 0
 
 
 if __name__ == "__main__":

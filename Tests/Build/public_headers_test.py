@@ -12,6 +12,9 @@ import tempfile
 HOSTILE = "#define min(a, b) hostile\n#define max(a, b) hostile\n#define small hostile\n#define interface hostile\n" \
           "#define near hostile\n#define far hostile\n#define ERROR hostile\n#define IN hostile\n#define OUT hostile\n"
 STANDARD = re.compile(r"^[a-z_0-9]+$")
+STANDARD_FIRST = "".join(f"#include <{name}>\n" for name in (
+    "algorithm", "atomic", "chrono", "condition_variable", "cstdint", "deque", "exception", "functional", "limits",
+    "map", "memory", "mutex", "optional", "random", "set", "sstream", "string", "thread", "unordered_map", "vector"))
 
 
 def public_headers(source):
@@ -23,10 +26,8 @@ def public_headers(source):
 def check(source, header, standard, hostile):
     root, name = header
     flags = ["-I", str(source / "API/Inc"), "-I", str(source / "Platform")]
-    # Boost itself does not survive such macros, so what it needs comes first, as a host would have it.
-    text = '#include "ostcore/Types.h"\n#include <algorithm>\n#include <chrono>\n#include <functional>\n' \
-           "#include <limits>\n#include <map>\n#include <mutex>\n#include <random>\n#include <sstream>\n" \
-           "#include <unordered_map>\n#include <vector>\n" + HOSTILE if hostile else ""
+    # Neither Boost nor the standard library survives such macros, so what they give comes first, as a host has it.
+    text = '#include "ostcore/Types.h"\n' + STANDARD_FIRST + HOSTILE if hostile else ""
     text += f'#include "{name}"\n'
     with tempfile.NamedTemporaryFile("w", suffix=".cpp") as file:
         file.write(text)

@@ -35,9 +35,10 @@ public:
     ImmutableString smartBinQuery;
 
     AssetBaseProperties() = default;
-    AssetBaseProperties(const UString& inName, const UString& inDescription, const ImmutableString& inAssetType,
-                        const ImmutableString& inParent, bool inIsMulticam,
-                        const ostmediatypes::TickTime& inZeroPoint, const ImmutableString& inSmartBinQuery);
+    AssetBaseProperties(const UString& inName, const UString& inDescription,
+                        const ImmutableString& inAssetType, const ImmutableString& inParent,
+                        bool inIsMulticam, const ostmediatypes::TickTime& inZeroPoint,
+                        const ImmutableString& inSmartBinQuery);
 
     friend ZOCL_EXPORT bool operator==(const AssetBaseProperties&, const AssetBaseProperties&);
     friend ZOCL_EXPORT bool operator!=(const AssetBaseProperties&, const AssetBaseProperties&);
@@ -85,20 +86,22 @@ public:
     static constexpr RFL::InterfaceID kInterfaceID{0x7a6f634173736574ull, 0x0000000000000002ull};
 
     /// Wraps an existing URL. Makes no request.
-    static InterfaceRef<IZOCAsset> Create(const ImmutableString& inURL, const InterfaceRef<IZOCDataServer>& inServer,
+    static InterfaceRef<IZOCAsset> Create(const ImmutableString& inURL,
+                                          const InterfaceRef<IZOCDataServer>& inServer,
                                           ResourceWritability inWritability);
     /// Posts a new asset to a factory; the completion's resource answers IZOCAsset and IZOCWritableAsset.
     static bool Create(const Guid& inRequestID, const ImmutableString& inFactoryURL,
                        const InterfaceRef<IZOCDataServer>& inServer, const AssetBaseProperties& inProperties,
                        const RequestCompletion& inCompletion);
 
-    virtual bool SetMediaLocatorAndUpdate(const InterfaceRef<IZOCMediaLocator>& inLocator, const Guid& inRequestID,
-                                          const RequestCompletion& inCompletion) = 0;
+    virtual bool SetMediaLocatorAndUpdate(const InterfaceRef<IZOCMediaLocator>& inLocator,
+                                          const Guid& inRequestID, const RequestCompletion& inCompletion) = 0;
     virtual bool SetMediaLocatorAndUpdate(const InterfaceRef<IZOCMediaLocator>& inLocator) = 0;
     /// Changes the object alone; true when something changed. Tags compare as a set.
     virtual bool SetAssetBaseProperties(const AssetBaseProperties& inProperties) = 0;
     /// Without a change the completion is called at once on this thread, with result 0 and no response.
-    virtual bool SetAssetBasePropertiesAndUpdate(const AssetBaseProperties& inProperties, const Guid& inRequestID,
+    virtual bool SetAssetBasePropertiesAndUpdate(const AssetBaseProperties& inProperties,
+                                                 const Guid& inRequestID,
                                                  const RequestCompletion& inCompletion) = 0;
     virtual void SetSubClip(const SubClip& inSubClip) = 0;
     virtual bool SetMediaLocator(const InterfaceRef<IZOCMediaLocator>& inLocator) = 0;

@@ -31,8 +31,8 @@ public:
     static constexpr RFL::InterfaceID kInterfaceID{0x7a6f63456e636c6full, 0x7375726500000002ull};
 
     /// The new payload can be read before the request has ended; a failure drops it again.
-    virtual bool PutEnclosurePayload(const shared_ptr<RecycledMemory const>& inPayload, const Guid& inRequestID,
-                                     const RequestCompletion& inCompletion) = 0;
+    virtual bool PutEnclosurePayload(const shared_ptr<RecycledMemory const>& inPayload,
+                                     const Guid& inRequestID, const RequestCompletion& inCompletion) = 0;
     /// Blocks.
     virtual bool PutEnclosurePayload(const shared_ptr<RecycledMemory const>& inPayload) = 0;
 };
@@ -70,8 +70,9 @@ ZOCL_EXPORT bool LoadSpecificEnclosure(const InterfaceRef<IZOCEnclosures>& inEnc
                                        const ImmutableString& inName, const Guid& inRequestID,
                                        const RequestCompletion& inCompletion);
 
-using EnclosureCopyPredicate = function<bool(const ImmutableString& inName, const InterfaceRef<IZOCEnclosures>& inFrom,
-                                             const InterfaceRef<IZOCEnclosures>& inTo)>;
+using EnclosureCopyPredicate =
+    function<bool(const ImmutableString& inName, const InterfaceRef<IZOCEnclosures>& inFrom,
+                  const InterfaceRef<IZOCEnclosures>& inTo)>;
 /// Copies the enclosures that the predicate accepts. Completes once, with the first failure or 0.
 ZOCL_EXPORT bool CopyEnclosuresIf(const Guid& inRequestID, const InterfaceRef<IZOCEnclosures>& inFrom,
                                   const InterfaceRef<IZOCEnclosures>& inTo,

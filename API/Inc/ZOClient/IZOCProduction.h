@@ -30,7 +30,8 @@ public:
     /// Blocks; null when there is none.
     virtual InterfaceRef<IZOCAsset> GetAssetByIdentifier(const ImmutableString& inIdentifier) = 0;
     /// The URL of an asset at a commit; an empty commit stands for the newest. Null without the link.
-    virtual ImmutableString GetAssetURL(const ImmutableString& inAssetID, const ImmutableString& inCommit) = 0;
+    virtual ImmutableString GetAssetURL(const ImmutableString& inAssetID,
+                                        const ImmutableString& inCommit) = 0;
     /// The href behind which the editing sessions stand, null without it.
     virtual ImmutableString GetSessionsLink() = 0;
     /// Blocks: loads the latest version of this production; its commit, null on failure.
@@ -73,12 +74,14 @@ public:
     /// The production of an entry, from the data server's cache or new; not loaded by this call.
     virtual InterfaceRef<IZOCProduction> GetProduction(const Entry& inEntry) = 0;
     /// Starts a load of the list, as IZOCServerResource does.
-    virtual bool Load(const Guid& inRequestID, const RequestCompletion& inCompletion, bool inReportErrors) = 0;
+    virtual bool Load(const Guid& inRequestID, const RequestCompletion& inCompletion,
+                      bool inReportErrors) = 0;
     /// Blocks.
     virtual bool Load(bool inReportErrors) = 0;
     /// Posts a new production through this list; the completion's resource answers IZOCProduction.
-    virtual bool GetNewProduction(const Guid& inRequestID, const UString& inName, const UString& inDescription,
-                                  bool inIsTemporary, const RequestCompletion& inCompletion) = 0;
+    virtual bool GetNewProduction(const Guid& inRequestID, const UString& inName,
+                                  const UString& inDescription, bool inIsTemporary,
+                                  const RequestCompletion& inCompletion) = 0;
     /// A fresh unloaded list at the "next" link; null when this is the last page.
     virtual InterfaceRef<IZOCProductionList> GetNextPage() = 0;
 };

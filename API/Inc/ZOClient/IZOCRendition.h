@@ -43,8 +43,8 @@ public:
     static constexpr RFL::InterfaceID kInterfaceID{0x7a6f6352656e6469ull, 0x74696f6e73000002ull};
 
     /// Posts a new rendition; the completion's resource answers IZOCRendition.
-    static bool CreateRendition(const InterfaceRef<IZOCDataServer>& inServer, const ImmutableString& inFactoryURL,
-                                const ImmutableString& inContentType,
+    static bool CreateRendition(const InterfaceRef<IZOCDataServer>& inServer,
+                                const ImmutableString& inFactoryURL, const ImmutableString& inContentType,
                                 const shared_ptr<RecycledMemory const>& inBody, const Guid& inRequestID,
                                 const RequestCompletion& inCompletion);
 

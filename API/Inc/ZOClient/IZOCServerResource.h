@@ -28,7 +28,8 @@ public:
     /// Loads with a GET. A loaded resource makes no request and calls the completion at once, on this
     /// thread, with result 0 and no response. A body that is not accepted reaches the completion with the
     /// result of its HTTP status, so look at IsLoaded.
-    virtual bool Load(const Guid& inRequestID, const RequestCompletion& inCompletion, bool inReportErrors) = 0;
+    virtual bool Load(const Guid& inRequestID, const RequestCompletion& inCompletion,
+                      bool inReportErrors) = 0;
     /// Blocks; true when the resource is loaded.
     virtual bool Load(bool inReportErrors) = 0;
     /// As the first, but HTTP 404 reaches the completion as kResultGone, a success.
@@ -44,7 +45,8 @@ public:
     virtual bool Refresh(const Guid& inRequestID, const RequestCompletion& inCompletion) = 0;
     /// Blocks and always fetches the whole body. The second argument is reserved.
     virtual bool Refresh(bool& outChanged, bool inReserved) = 0;
-    virtual bool RefreshTreatingMissingAsEmpty(const Guid& inRequestID, const RequestCompletion& inCompletion) = 0;
+    virtual bool RefreshTreatingMissingAsEmpty(const Guid& inRequestID,
+                                               const RequestCompletion& inCompletion) = 0;
     virtual ImmutableString GetHTTPURL() = 0;
     virtual ImmutableString GetLatestVersionLink() = 0;
     /// The tag of what is held. For an unloaded resource: null, or, when a fetch is allowed, the tag that a

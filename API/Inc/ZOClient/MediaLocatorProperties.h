@@ -19,9 +19,12 @@ struct ZOCL_EXPORT MediaLocatorStillSequenceParams {
     std::int32_t numDigits = 0;
     bool leadingZeroes = false;
 
-    friend ZOCL_EXPORT bool operator==(const MediaLocatorStillSequenceParams&, const MediaLocatorStillSequenceParams&);
-    friend ZOCL_EXPORT bool operator!=(const MediaLocatorStillSequenceParams&, const MediaLocatorStillSequenceParams&);
-    friend ZOCL_EXPORT bool operator<(const MediaLocatorStillSequenceParams&, const MediaLocatorStillSequenceParams&);
+    friend ZOCL_EXPORT bool operator==(const MediaLocatorStillSequenceParams&,
+                                       const MediaLocatorStillSequenceParams&);
+    friend ZOCL_EXPORT bool operator!=(const MediaLocatorStillSequenceParams&,
+                                       const MediaLocatorStillSequenceParams&);
+    friend ZOCL_EXPORT bool operator<(const MediaLocatorStillSequenceParams&,
+                                      const MediaLocatorStillSequenceParams&);
 };
 
 /// Where an asset's media lies. A plain value; the order is stable within one run and serves containers.

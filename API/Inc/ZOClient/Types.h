@@ -25,9 +25,9 @@ class IZOCDataServer;
 /// resource, and the response, each of the latter two null when there is none. Called exactly once when the
 /// starting call returned true, on a worker of the network layer with no lock held, unless the operation
 /// says that it may call on the caller's stack.
-using RequestCompletion = function<void(const Guid& inRequestID, int inResult,
-                                        const InterfaceRef<IZOCServerResource>& inResource,
-                                        const shared_ptr<ostnet::Response>& inResponse)>;
+using RequestCompletion =
+    function<void(const Guid& inRequestID, int inResult, const InterfaceRef<IZOCServerResource>& inResource,
+                  const shared_ptr<ostnet::Response>& inResponse)>;
 
 /// Whether a resource may be written through.
 enum class ResourceWritability { kReadOnly = 0, kWritable = 1, kKeep = 2 };

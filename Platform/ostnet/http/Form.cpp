@@ -1,6 +1,6 @@
 // The writing of multipart/form-data bodies (RFC 7578).
 #include "ostnet/HeaderConstants.h"
-#include "ostnet/http/HeaderRules.h"
+#include "ostnet/http/detail/HeaderRules.h"
 #include "ostnet/http/RequestProcessor.h"
 
 namespace ostnet {

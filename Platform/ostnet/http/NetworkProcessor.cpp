@@ -3,9 +3,9 @@
 #include <unordered_map>
 
 #include "ostcore/debug/Trace.h"
-#include "ostnet/http/DelayedFunctions.h"
-#include "ostnet/http/NetworkThread.h"
-#include "ostnet/http/WorkerPool.h"
+#include "ostnet/http/detail/DelayedFunctions.h"
+#include "ostnet/http/detail/NetworkThread.h"
+#include "ostnet/http/detail/WorkerPool.h"
 #include "zourl/http/URL.h"
 
 namespace ostnet {

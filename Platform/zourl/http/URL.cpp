@@ -1,5 +1,10 @@
 #include "zourl/http/URL.h"
 
+#include <boost/config.hpp>
+// The parser is compiled into this source alone. Its classes ask to be visible; a host with another version
+// of it must not meet ours.
+#undef BOOST_SYMBOL_VISIBLE
+#define BOOST_SYMBOL_VISIBLE
 #include <boost/url/parse.hpp>
 #include <boost/url/src.hpp>
 #include <boost/url/url_view.hpp>

@@ -1,7 +1,7 @@
-#include "ostnet/http/WorkerPool.h"
+#include "ostnet/http/detail/WorkerPool.h"
 
 #include "ostcore/debug/Trace.h"
-#include "ostnet/http/ThreadStart.h"
+#include "ostnet/http/detail/ThreadStart.h"
 
 namespace ostnet {
 namespace http {

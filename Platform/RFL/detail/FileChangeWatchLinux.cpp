@@ -4,7 +4,7 @@
 #include <sys/inotify.h>
 #include <unistd.h>
 
-#include "RFL/FileChangeWatch.h"
+#include "RFL/detail/FileChangeWatch.h"
 
 namespace RFL {
 

@@ -1,4 +1,4 @@
-#include "ostnet/http/HeaderRules.h"
+#include "ostnet/http/detail/HeaderRules.h"
 
 #include <charconv>
 

@@ -9,7 +9,7 @@
 #include <string>
 #include <vector>
 
-#include "ostnet/http/HeaderRules.h"
+#include "ostnet/http/detail/HeaderRules.h"
 #include "ostnet/http/RequestProcessor.h"
 #include "ostnet/NetworkSettings.h"
 

@@ -1,4 +1,4 @@
-#include "ostnet/http/DelayedFunctions.h"
+#include "ostnet/http/detail/DelayedFunctions.h"
 
 namespace ostnet {
 namespace http {

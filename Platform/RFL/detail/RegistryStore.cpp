@@ -3,7 +3,7 @@
 // Waiting is left to SQLite's busy handler with a deadline per operation; no lock of ours is held while
 // SQLite works. Each operation takes an idle connection or opens one, so threads of one process meet each
 // other as processes do.
-#include "RFL/RegistryStore.h"
+#include "RFL/detail/RegistryStore.h"
 
 #include <sqlite3.h>
 #include <unistd.h>
@@ -15,7 +15,7 @@
 #include <vector>
 
 #include "ostcore/threads/Mutex.h"
-#include "RFL/RegistryFiles.h"
+#include "RFL/detail/RegistryFiles.h"
 #include "RFL/RFLUnknown.h"
 
 namespace RFL {

@@ -1,4 +1,4 @@
-#include "ostnet/http/NetworkThread.h"
+#include "ostnet/http/detail/NetworkThread.h"
 
 #include <openssl/err.h>
 #include <openssl/ssl.h>
@@ -10,7 +10,7 @@
 #include <array>
 
 #include "ostcore/debug/Trace.h"
-#include "ostnet/http/ThreadStart.h"
+#include "ostnet/http/detail/ThreadStart.h"
 
 namespace ostnet {
 namespace http {

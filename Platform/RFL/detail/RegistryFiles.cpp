@@ -1,5 +1,5 @@
 // Files of the registry on POSIX systems.
-#include "RFL/RegistryFiles.h"
+#include "RFL/detail/RegistryFiles.h"
 
 #include <fcntl.h>
 #include <sys/stat.h>
@@ -10,7 +10,7 @@
 
 #include "ostcore/config/StateDirectories.h"
 #include "ostcore/filesupport/Dir.h"
-#include "RFL/RegistryStore.h"
+#include "RFL/detail/RegistryStore.h"
 #include "RFL/RFLUnknown.h"
 
 namespace RFL {

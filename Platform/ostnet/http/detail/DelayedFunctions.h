@@ -7,7 +7,7 @@
 
 #include "ostcore/threads/Mutex.h"
 #include "ostcore/threads/Scheduler.h"
-#include "ostnet/http/WorkerPool.h"
+#include "ostnet/http/detail/WorkerPool.h"
 
 namespace ostnet {
 namespace http {

@@ -1,4 +1,4 @@
-#include "ostnet/http/Exchange.h"
+#include "ostnet/http/detail/Exchange.h"
 
 #include "ostcore/utility/StringConversion.h"
 #include "ostnet/HeaderConstants.h"

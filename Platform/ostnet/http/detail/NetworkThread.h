@@ -12,7 +12,7 @@
 #include <vector>
 
 #include "ostcore/threads/Mutex.h"
-#include "ostnet/http/Exchange.h"
+#include "ostnet/http/detail/Exchange.h"
 
 namespace ostnet {
 namespace http {
