@@ -42,8 +42,8 @@ format:
 format-check:
 	clang-format --dry-run -Werror $(SOURCES)
 
-tidy: build
-	python3 Tools/dev/tidy.py build/dev
+tidy: analysis
+	python3 Tools/dev/tidy.py build/analysis
 
 clean:
 	rm -rf build

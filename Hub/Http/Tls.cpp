@@ -32,7 +32,7 @@ constexpr long kRenewSeconds = 30 * 86400;
 }
 
 Key MakeKey() {
-    Key key(EVP_EC_gen("P-256"), EVP_PKEY_free);
+    Key key(EVP_PKEY_Q_keygen(nullptr, nullptr, "EC", static_cast<char const*>("P-256")), EVP_PKEY_free);
     if (!key)
         Fail("no key");
     return key;

@@ -1,33 +1,24 @@
 #!/usr/bin/env python3
-"""Runs clang-tidy over the sources of the product, two at a time, and fails on any finding."""
+"""Runs clang-tidy over the sources of the product and fails on any finding.
+
+Takes the build folder of the analysis preset: what clang compiled there, headers and all, clang-tidy can read.
+"""
 import concurrent.futures
 import json
 import os
 import pathlib
+import shlex
 import subprocess
 import sys
 import tempfile
 
 ROOTS = ("Platform", "Src", "Hub", "Tools", "Testing")
-# Flags that only gcc knows, or that would ask clang for gcc's precompiled headers.
-DROPPED = ("-fpch-preprocess", "-Winvalid-pch")
 
 
 def clean_command(entry):
-    words = entry["command"].split() if "command" in entry else list(entry["arguments"])
-    out, skip = [], False
-    for position, word in enumerate(words):
-        if skip:
-            skip = False
-            continue
-        if word == "-include" and position + 1 < len(words) and "cmake_pch" in words[position + 1]:
-            skip = True
-            continue
-        if word in DROPPED or word.endswith("ccache") or "=" in word and word.startswith("CCACHE_"):
-            continue
-        out.append(word)
-    start = next(i for i, word in enumerate(out) if os.path.basename(word).startswith(("c++", "g++", "clang++")))
-    return out[start:]
+    """The compiler's words, without the launcher in front of them."""
+    words = shlex.split(entry["command"]) if "command" in entry else list(entry["arguments"])
+    return words[next(i for i, word in enumerate(words) if os.path.basename(word).startswith("clang++")):]
 
 
 def main() -> int:

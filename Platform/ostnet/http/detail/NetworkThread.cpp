@@ -270,8 +270,11 @@ void NetworkThread::WaitForEvents() {
             [[maybe_unused]] const auto size = read(mWakeUp, &wakes, sizeof wakes);
             continue;
         }
-        if (SocketOf(event.data.fd).wanted == 0) {
-            Watch(event.data.fd, 0);
+        if (const Socket& socket = SocketOf(event.data.fd); socket.wanted == 0) {
+            // One that was closed since the events were fetched may be somebody else's descriptor by now.
+            if (socket.watched != 0) {
+                Watch(event.data.fd, 0);
+            }
             continue;
         }
         int running = 0;
