@@ -270,6 +270,13 @@ int RegistryConnection::CheckIdentity(RegistryRoot inRoot) {
     if (result == kResultSuccess) {
         result = ReadNumber(*this, "SELECT count(*) FROM sqlite_schema", tables);
     }
+    // The reads are no one snapshot: another process may have set the file up between them.
+    if (result == kResultSuccess && application == 0 && (version != 0 || tables != 0)) {
+        result = ReadNumber(*this, "PRAGMA application_id", application);
+        if (result == kResultSuccess) {
+            result = ReadNumber(*this, "PRAGMA user_version", version);
+        }
+    }
     if (result < 0) {
         return result;
     }
