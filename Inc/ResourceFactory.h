@@ -37,9 +37,12 @@ public:
                                    const RequestCompletion& inCompletion) = 0;
 };
 
+class CollaborationFactory;
+
 /// What the composition root puts in place; each pointer is null before Initialize and after Shutdown.
 struct CompositionRoot {
     ResourceFactory* resources = nullptr;
+    CollaborationFactory* collaboration = nullptr;
 };
 /// Written by Initialize and Shutdown on the main thread only, read anywhere between the two.
 CompositionRoot& GetCompositionRoot();
