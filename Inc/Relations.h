@@ -78,7 +78,9 @@
     X(kRelation_Create, "create")                \
     X(kRelation_Locator, "locator")              \
     X(kRelation_Related, "related")              \
-    X(kRelation_Next, "next")
+    X(kRelation_Next, "next")                    \
+    X(kRelation_AcceptTheirs, "accept-theirs")   \
+    X(kRelation_AcceptYours, "accept-yours")
 
 namespace ZOCL {
 

@@ -1,5 +1,6 @@
 // Start and end of the library: puts the floors together and takes them down in an order in which nothing is
 // used after it has gone.
+#include "Collaboration/CollaborationResources.h"
 #include "Frame/Station.h"
 #include "Frame/SyslogLogger.h"
 #include "Model/ModelResourceFactory.h"
@@ -26,6 +27,7 @@ void Initialize() {
     ostnet::Startup();
     RegisterStation();
     GetCompositionRoot().resources = GetModelResourceFactory();
+    GetCompositionRoot().collaboration = GetCollaborationFactory();
 }
 
 void Shutdown() {
@@ -36,6 +38,7 @@ void Shutdown() {
     // The network's last completions still make resources, so the factory goes after it.
     ostnet::Shutdown();
     GetCompositionRoot().resources = nullptr;
+    GetCompositionRoot().collaboration = nullptr;
     // Last, since whatever ran until here may have remembered something.
     RFL::CloseRegistry();
 }

@@ -10,6 +10,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include "Collaboration/CollaborationResources.h"
 #include "Connection/DataServer.h"
 #include "Connection/ServiceDocument.h"
 #include "dto/TransferStructure.h"
@@ -102,6 +103,7 @@ class ClientTest : public testing::Test {
 protected:
     explicit ClientTest(std::size_t inWorkers = 2) : net(inWorkers) {
         GetCompositionRoot().resources = GetModelResourceFactory();
+        GetCompositionRoot().collaboration = GetCollaborationFactory();
         mFormerSink = ostcore::debug::SetTraceSink([this](const std::string& inLine) {
             std::lock_guard<std::mutex> lock(mMutex);
             mTraces.push_back(inLine);
