@@ -181,6 +181,15 @@ std::string JsonString(std::string_view inText) {
     return text;
 }
 
+void AppendMember(std::string& ioTarget, std::string_view inKey, std::string_view inValue) {
+    if (ioTarget.back() != '{')
+        ioTarget += ',';
+    ioTarget += '"';
+    ioTarget += inKey;
+    ioTarget += "\":";
+    AppendJsonString(ioTarget, inValue);
+}
+
 bool IsIdentifier(std::string_view inText) {
     bool const charactersOk = std::all_of(inText.begin(), inText.end(), [](char c) {
         return IsAlnum(c) || c == '-' || c == '_' || c == '.' || c == '{' || c == '}';

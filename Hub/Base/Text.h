@@ -25,6 +25,9 @@ std::vector<std::string_view> Split(std::string_view inText, char inSeparator);
 void AppendJsonString(std::string& ioTarget, std::string_view inText);
 std::string JsonString(std::string_view inText);
 
+/// Appends "key":"value" to an object that is being written, with a comma before it unless it is the first.
+void AppendMember(std::string& ioTarget, std::string_view inKey, std::string_view inValue);
+
 /// An identifier that may stand in a path segment as it is: letters, digits and "-_.{}", 1 to 160 of them,
 /// and not made of dots alone.
 bool IsIdentifier(std::string_view inText);

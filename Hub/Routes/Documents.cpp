@@ -8,16 +8,6 @@ namespace zohub {
 
 namespace {
 
-// ,"key":"value" with the comma left out after an opening brace.
-void AppendMember(std::string& ioTarget, std::string_view inKey, std::string_view inValue) {
-    if (ioTarget.back() != '{')
-        ioTarget += ',';
-    ioTarget += '"';
-    ioTarget += inKey;
-    ioTarget += "\":";
-    AppendJsonString(ioTarget, inValue);
-}
-
 void AppendRaw(std::string& ioTarget, std::string_view inKey, std::string_view inJson) {
     if (ioTarget.back() != '{')
         ioTarget += ',';
