@@ -20,23 +20,64 @@ bool IsHead(std::string const& inCommit) {
 
 }  // namespace
 
+std::string const& ScopeOf(LineRecord const& inLine) {
+    if (inLine.kind == kLineSession)
+        return inLine.id;
+    return inLine.kind == kLineTransaction ? inLine.parent : inLine.production;
+}
+
 bool Repository::MayRead(LineRecord const& inLine, Actor const& inActor) {
-    return inActor.isAdmin || inLine.owner == inActor.name || inLine.kind == kLineTemplate ||
+    if (inActor.isAdmin)
+        return true;
+    bool const isShared = inLine.id == inLine.production;
+    if (!isShared) {
+        if (inLine.owner != inActor.name)
+            return false;
+        // His own, but only as long as the production is open to him.
+        auto const production = mTransaction.FindLine(inLine.production);
+        return production && MayRead(*production, inActor);
+    }
+    return inLine.owner == inActor.name || inLine.kind == kLineTemplate ||
            mTransaction.HasGrant(inLine.production, inActor.name);
 }
 
-View Repository::Open(std::string const& inLineId, std::string const& inCommit, Actor const& inActor) {
+bool Repository::HasCommit(LineRecord const& inLine, CommitRecord const& inCommit) {
+    if (inCommit.production != inLine.production)
+        return false;
+    bool const isShared = inCommit.line == inCommit.production;
+    return isShared || inCommit.line == inLine.id ||
+           (inLine.kind == kLineTransaction && inCommit.line == inLine.parent);
+}
+
+View Repository::LiveView(LineRecord inLine, Actor const& inActor) {
     View view;
+    view.line = std::move(inLine);
+    bool const isOwner = view.line.owner == inActor.name;
+    if (view.IsSession())
+        view.mayManage = isOwner;
+    else if (view.IsTransaction())
+        view.mayWrite = isOwner && !view.line.isEnded;
+    else
+        view.mayWrite = view.line.kind != kLineTemplate || isOwner || inActor.isAdmin;
+    auto commit = mTransaction.FindCommit(view.line.headCommit);
+    if (!commit)
+        throw std::runtime_error("the commit " + view.line.headCommit + " is missing; run zohub check");
+    view.commit = std::move(*commit);
+    view.tree = LoadTree(view.commit.tree);
+    return view;
+}
+
+View Repository::Open(std::string const& inLineId, std::string const& inCommit, Actor const& inActor) {
     auto line = mTransaction.FindLine(inLineId);
     if (!line || !MayRead(*line, inActor))
         FailNotFound("The production");
-    view.line = std::move(*line);
-    view.isPinned = !IsHead(inCommit);
-    bool const isSharedTemplate = view.line.kind == kLineTemplate && view.line.owner != inActor.name;
-    view.mayWrite = !isSharedTemplate || inActor.isAdmin;
-    auto commit = mTransaction.FindCommit(view.isPinned ? inCommit : view.line.headCommit);
-    if (!commit || commit->production != view.line.production)
+    View view = LiveView(std::move(*line), inActor);
+    if (IsHead(inCommit))
+        return view;
+    auto commit = mTransaction.FindCommit(inCommit);
+    if (!commit || !HasCommit(view.line, *commit))
         FailNotFound("The commit of the production");
+    view.isPinned = true;
     view.commit = std::move(*commit);
     view.tree = LoadTree(view.commit.tree);
     return view;
@@ -80,38 +121,55 @@ std::string Repository::AddContent(std::string_view inBytes) {
     return hash;
 }
 
-void Repository::AddEnclosureReference(std::string const& inProduction, EnclosureState const& inEnclosure) {
-    mTransaction.AddReference({inProduction, kReferenceEnclosure, inEnclosure.content, inEnclosure.id,
+void Repository::AddEnclosureReference(std::string const& inScope, EnclosureState const& inEnclosure) {
+    mTransaction.AddReference({inScope, kReferenceEnclosure, inEnclosure.content, inEnclosure.id,
                                inEnclosure.name, inEnclosure.type});
 }
 
-std::string Repository::AddAsset(std::string const& inProduction, AssetState const& inState) {
+void Repository::AddAssetReferences(std::string const& inScope, AssetState const& inState,
+                                    std::string const& inHash) {
+    mTransaction.AddReference({inScope, kReferenceAsset, inHash, inState.id, "", ""});
+    for (auto const& enclosure : inState.enclosures)
+        AddEnclosureReference(inScope, enclosure);
+    for (auto const& rendition : inState.renditions)
+        mTransaction.AddReference(
+            {inScope, kReferenceRendition, rendition.content, rendition.id, "", rendition.type});
+    if (!inState.locator.empty())
+        mTransaction.AddReference({inScope, kReferenceLocator, inState.locator, inState.id, "", ""});
+}
+
+std::string Repository::AddAsset(std::string const& inScope, AssetState const& inState) {
     std::string const text = WriteAssetState(inState);
     std::string hash = Sha256Hex(text);
     mTransaction.AddObject(hash, text);
-    mTransaction.AddReference({inProduction, kReferenceAsset, hash, inState.id, "", ""});
-    for (auto const& enclosure : inState.enclosures)
-        AddEnclosureReference(inProduction, enclosure);
-    for (auto const& rendition : inState.renditions)
-        mTransaction.AddReference(
-            {inProduction, kReferenceRendition, rendition.content, rendition.id, "", rendition.type});
-    if (!inState.locator.empty())
-        mTransaction.AddReference({inProduction, kReferenceLocator, inState.locator, inState.id, "", ""});
+    AddAssetReferences(inScope, inState, hash);
     return hash;
 }
 
-CommitRecord Repository::WriteCommit(std::string const& inProduction, std::string const& inParent,
-                                     TreeRoot const& inTree, std::string const& inTitle,
-                                     Actor const& inCommitter, Micros inNow) {
+std::optional<ReferenceRecord> Repository::FindReference(LineRecord const& inLine, std::string const& inKind,
+                                                         std::string const& inKey) {
+    std::string const& scope = ScopeOf(inLine);
+    auto reference = mTransaction.FindReference(scope, inKind, inKey);
+    if (!reference && scope != inLine.production)
+        reference = mTransaction.FindReference(inLine.production, inKind, inKey);
+    return reference;
+}
+
+// On top of the line's head.
+CommitRecord Repository::WriteCommit(LineRecord const& inLine, TreeRoot const& inTree,
+                                     std::string const& inTitle, Actor const& inCommitter, Micros inNow) {
     CommitRecord commit;
     std::string const treeText = WriteTreeRoot(inTree);
     commit.tree = Sha256Hex(treeText);
     mTransaction.AddObject(commit.tree, treeText);
-    commit.production = inProduction;
-    commit.parent = inParent;
+    commit.production = inLine.production;
+    commit.parent = inLine.headCommit;
     commit.title = inTitle;
     commit.committer = inCommitter.name;
     commit.time = inNow;
+    commit.line = inLine.id;
+    auto const parent = mTransaction.FindCommit(commit.parent);
+    commit.number = parent ? parent->number + 1 : 1;
     commit.id = CommitIdentifier(commit);
     // The same change made twice within one tick of the clock must still be two commits.
     while (mTransaction.FindCommit(commit.id)) {
@@ -133,24 +191,30 @@ LineRecord Repository::CreateLine(std::string const& inKind, TreeRoot const& inT
     line.isTemporary = inIsTemporary;
     line.created = inNow;
     line.modified = inNow;
-    line.headCommit = WriteCommit(line.id, "", inTree, inTitle, inOwner, inNow).id;
+    line.headCommit = WriteCommit(line, inTree, inTitle, inOwner, inNow).id;
     mTransaction.PutLine(line);
     return line;
 }
 
 void Repository::CommitEdit(View& ioView, Edit const& inEdit, std::string const& inTitle,
                             Actor const& inCommitter, Micros inNow) {
+    TreeRoot tree = ioView.tree;
     if (!inEdit.assets.empty()) {
-        auto const written = AssetMap(mTransaction, ioView.tree.assets).Apply(inEdit.assets);
-        ioView.tree.assets = written.root;
-        ioView.tree.assetCount = written.count;
+        auto const written = AssetMap(mTransaction, tree.assets).Apply(inEdit.assets);
+        tree.assets = written.root;
+        tree.assetCount = written.count;
     }
     if (inEdit.properties)
-        ioView.tree.properties = *inEdit.properties;
+        tree.properties = *inEdit.properties;
     if (inEdit.enclosures)
-        ioView.tree.enclosures = *inEdit.enclosures;
-    ioView.commit =
-        WriteCommit(ioView.line.production, ioView.line.headCommit, ioView.tree, inTitle, inCommitter, inNow);
+        tree.enclosures = *inEdit.enclosures;
+    CommitTree(ioView, tree, inTitle, inCommitter, inNow);
+}
+
+void Repository::CommitTree(View& ioView, TreeRoot const& inTree, std::string const& inTitle,
+                            Actor const& inCommitter, Micros inNow) {
+    ioView.tree = inTree;
+    ioView.commit = WriteCommit(ioView.line, inTree, inTitle, inCommitter, inNow);
     ioView.line.headCommit = ioView.commit.id;
     ioView.line.modified = inNow;
     mTransaction.PutLine(ioView.line);

@@ -22,21 +22,33 @@ struct View {
     LineRecord line;
     CommitRecord commit;
     TreeRoot tree;
-    bool isPinned = false;  ///< the commit was named, so nothing can be written through this view
-    bool mayWrite = false;  ///< the actor may write to the line
+    bool isPinned = false;   ///< the commit was named, so nothing can be written through this view
+    bool mayWrite = false;   ///< the actor may write to the line
+    bool mayManage = false;  ///< the line is the actor's own session: he shares it and opens transactions
+
+    bool IsSession() const { return line.kind == kLineSession; }
+    bool IsTransaction() const { return line.kind == kLineTransaction; }
 };
+
+/// Under what references are listed that the line makes: what a session has not shared yet is its own.
+std::string const& ScopeOf(LineRecord const& inLine);
 
 class Repository {
 public:
     explicit Repository(Transaction& inTransaction) : mTransaction(inTransaction) {}
 
-    /// The view of a production or template. inCommit is empty or "HEAD" for the live state.
+    /// The view of a line. inCommit is empty or "HEAD" for the live state.
     /// Throws Failure 404 for an unknown line or commit, and for one that the actor may not read.
     View Open(std::string const& inLineId, std::string const& inCommit, Actor const& inActor);
 
     bool MayRead(LineRecord const& inLine, Actor const& inActor);
 
-    /// A new line with a first commit. Properties have been checked.
+    /// Whether the line may show the commit: its own, or one of a line below it.
+    static bool HasCommit(LineRecord const& inLine, CommitRecord const& inCommit);
+    /// The present state of the line, which the caller may see. Throws std::runtime_error for a damaged one.
+    View LiveView(LineRecord inLine, Actor const& inActor);
+
+    /// A new production or template with a first commit. Properties have been checked.
     LineRecord CreateLine(std::string const& inKind, TreeRoot const& inTree, std::string const& inTitle,
                           Actor const& inOwner, bool inIsTemporary, Micros inNow);
 
@@ -49,9 +61,14 @@ public:
 
     /// Stores payload bytes and returns their content identifier.
     std::string AddContent(std::string_view inBytes);
-    /// Stores the state with all references that make it readable through the production.
-    std::string AddAsset(std::string const& inProduction, AssetState const& inState);
-    void AddEnclosureReference(std::string const& inProduction, EnclosureState const& inEnclosure);
+    /// Stores the state with all references that make it readable through lines of that scope.
+    std::string AddAsset(std::string const& inScope, AssetState const& inState);
+    /// Makes a stored state readable through lines of that scope.
+    void AddAssetReferences(std::string const& inScope, AssetState const& inState, std::string const& inHash);
+    void AddEnclosureReference(std::string const& inScope, EnclosureState const& inEnclosure);
+    /// What the line, or the production below it, refers to or once did.
+    std::optional<ReferenceRecord> FindReference(LineRecord const& inLine, std::string const& inKind,
+                                                 std::string const& inKey);
 
     /// What a commit changes; states are hashes from AddAsset.
     struct Edit {
@@ -63,11 +80,13 @@ public:
     /// Writes one new commit on the line and moves its head; ioView shows the new state afterwards.
     void CommitEdit(View& ioView, Edit const& inEdit, std::string const& inTitle, Actor const& inCommitter,
                     Micros inNow);
+    /// As CommitEdit, with a tree whose parts are stored already.
+    void CommitTree(View& ioView, TreeRoot const& inTree, std::string const& inTitle,
+                    Actor const& inCommitter, Micros inNow);
 
 private:
-    CommitRecord WriteCommit(std::string const& inProduction, std::string const& inParent,
-                             TreeRoot const& inTree, std::string const& inTitle, Actor const& inCommitter,
-                             Micros inNow);
+    CommitRecord WriteCommit(LineRecord const& inLine, TreeRoot const& inTree, std::string const& inTitle,
+                             Actor const& inCommitter, Micros inNow);
 
     Transaction& mTransaction;
 };

@@ -92,7 +92,7 @@ Response LoadAsset(Call& ioCall, bool inIsPinned) {
 // Writes the one state and answers with its document.
 Response CommitAsset(Call& ioCall, View& ioView, AssetState const& inAsset, std::string const& inTitle,
                      int inStatus) {
-    std::string const hash = ioCall.repository.AddAsset(ioView.line.production, inAsset);
+    std::string const hash = ioCall.repository.AddAsset(ScopeOf(ioView.line), inAsset);
     Repository::Edit edit;
     edit.assets[inAsset.id] = hash;
     ioCall.repository.CommitEdit(ioView, edit, inTitle, ioCall.actor, ioCall.now);
@@ -149,7 +149,7 @@ Response DeleteAsset(Call& ioCall) {
 Response RestoreAsset(Call& ioCall) {
     View view = OpenForWriting(ioCall);
     std::string const& hash = ioCall.parameters[1];
-    if (!ioCall.transaction.FindReference(view.line.production, kReferenceAsset, hash))
+    if (!ioCall.repository.FindReference(view.line, kReferenceAsset, hash))
         throw Failure(404, "not-found",
                       "This production never had an asset state with that content identifier.");
     AssetState const asset = ioCall.repository.LoadAsset(hash);

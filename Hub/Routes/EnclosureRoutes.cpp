@@ -96,7 +96,7 @@ Response DeleteEnclosure(Call& ioCall, OwnerKind inKind) {
 
 ReferenceRecord GetReference(Call& ioCall, char const* inKind) {
     View const view = OpenView(ioCall, false);
-    auto reference = ioCall.transaction.FindReference(view.line.production, inKind, ioCall.parameters[1]);
+    auto reference = ioCall.repository.FindReference(view.line, inKind, ioCall.parameters[1]);
     if (!reference)
         throw Failure(404, "not-found", "This production has no content with that identifier.");
     return std::move(*reference);

@@ -51,11 +51,11 @@ RenditionState& ItemOwner::GetRendition(std::string const& inId) {
 void ItemOwner::Commit(Call& ioCall, std::string const& inTitle) {
     Repository::Edit edit;
     if (mIsAsset) {
-        mHash = ioCall.repository.AddAsset(mView.line.production, mAsset);
+        mHash = ioCall.repository.AddAsset(ScopeOf(mView.line), mAsset);
         edit.assets[mAsset.id] = mHash;
     } else {
         for (auto const& enclosure : mView.tree.enclosures)
-            ioCall.repository.AddEnclosureReference(mView.line.production, enclosure);
+            ioCall.repository.AddEnclosureReference(ScopeOf(mView.line), enclosure);
         edit.enclosures = mView.tree.enclosures;
     }
     ioCall.repository.CommitEdit(mView, edit, inTitle, ioCall.actor, ioCall.now);

@@ -28,7 +28,8 @@ struct TokenRecord {
     Micros expires = 0;
 };
 
-/// A line of commits: a shared production or a template, and later a session or a transaction on top of one.
+/// A line of commits: a shared production or a template, a user's session on one, or a transaction on a
+/// session.
 struct LineRecord {
     std::string id;
     std::string kind;
@@ -41,10 +42,13 @@ struct LineRecord {
     bool isTemporary = false;
     Micros created = 0;
     Micros modified = 0;
+    bool isEnded = false;  ///< a transaction that was committed
 };
 
 inline constexpr char kLineProduction[] = "production";
 inline constexpr char kLineTemplate[] = "template";
+inline constexpr char kLineSession[] = "session";
+inline constexpr char kLineTransaction[] = "transaction";
 
 struct CommitRecord {
     std::string id;
@@ -54,9 +58,36 @@ struct CommitRecord {
     std::string title;
     std::string committer;
     Micros time = 0;
+    std::string line;         ///< on which it was made; the production for a shared one
+    std::int64_t number = 0;  ///< one more than its parent's; along a shared line it tells older from newer
 };
 
-/// Says that a production has, or once had, this content; it is what makes content readable through it.
+/// One item that a merge could not decide: the session keeps its own side until its owner accepts one.
+struct ConflictRecord {
+    std::string session;
+    std::string kind;           ///< one of the kConflict constants
+    std::string item;           ///< asset; empty for the production's own enclosures and properties
+    std::string name;           ///< of the enclosure, else empty
+    std::string theirsContent;  ///< content identifier of their state, or "removed"
+    std::string baseCommit;     ///< the common ancestor
+};
+
+inline constexpr char kConflictAsset[] = "asset";
+inline constexpr char kConflictEnclosure[] = "enclosure";
+inline constexpr char kConflictProperties[] = "properties";
+
+/// An enclosure that is kept with a session and is no part of any commit.
+struct NoteRecord {
+    std::string session;
+    std::string id;
+    std::string name;
+    std::string type;
+    std::string content;
+    std::uint64_t size = 0;
+};
+
+/// Says that a production has, or once had, this content; it is what makes content readable through it. What
+/// only a session has seen so far is listed under the session instead.
 struct ReferenceRecord {
     std::string production;
     std::string kind;  ///< one of the kReference constants

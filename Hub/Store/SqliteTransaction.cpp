@@ -1,45 +1,22 @@
 // The operations of a transaction, one statement each.
 #include "Store/SqliteTransaction.h"
 
-#include <stdexcept>
+#include "Store/SqliteLines.h"
 
 namespace zohub {
 
 namespace {
 
-#define LINE_COLUMNS "id,kind,parent,production,owner,base,head,metadata,temporary,created,modified"
-
-LineRecord ReadLine(Statement const& inRow) {
-    LineRecord line;
-    line.id = inRow.Text(0);
-    line.kind = inRow.Text(1);
-    line.parent = inRow.Text(2);
-    line.production = inRow.Text(3);
-    line.owner = inRow.Text(4);
-    line.baseCommit = inRow.Text(5);
-    line.headCommit = inRow.Text(6);
-    line.metadata = inRow.Text(7);
-    line.isTemporary = inRow.Number(8) != 0;
-    line.created = inRow.Number(9);
-    line.modified = inRow.Number(10);
-    return line;
-}
-
 TokenRecord ReadToken(Statement const& inRow) {
     return {inRow.Text(0), inRow.Text(1), inRow.Text(2), inRow.Text(3), inRow.Number(4), inRow.Number(5)};
 }
 
-CommitRecord ReadCommit(Statement const& inRow) {
-    return {inRow.Text(0), inRow.Text(1), inRow.Text(2),  inRow.Text(3),
-            inRow.Text(4), inRow.Text(5), inRow.Number(6)};
-}
-
-class SqliteTransaction : public Transaction {
+class SqliteTransaction : public SqliteLines {
 public:
     using ReturnFunction = std::function<void(std::unique_ptr<SqliteConnection>)>;
 
     SqliteTransaction(std::unique_ptr<SqliteConnection> inConnection, ReturnFunction inReturn)
-        : mConnection(std::move(inConnection)), mReturn(std::move(inReturn)) {}
+        : SqliteLines(std::move(inConnection)), mReturn(std::move(inReturn)) {}
 
     ~SqliteTransaction() override {
         try {
@@ -115,45 +92,6 @@ public:
         mConnection->Prepare("DELETE FROM tokens WHERE expires<=?").Bind(inTime).Run();
     }
 
-    std::optional<LineRecord> FindLine(std::string const& inId) override {
-        auto row = mConnection->Prepare("SELECT " LINE_COLUMNS " FROM lines WHERE id=?");
-        if (!row.Bind(inId).Step())
-            return std::nullopt;
-        return ReadLine(row);
-    }
-
-    std::vector<LineRecord> ListLines(std::string const& inKind) override {
-        auto row =
-            mConnection->Prepare("SELECT " LINE_COLUMNS " FROM lines WHERE kind=? ORDER BY created,id");
-        row.Bind(inKind);
-        return ReadLines(row);
-    }
-
-    std::vector<LineRecord> ListLinesVisibleTo(std::string const& inUser,
-                                               std::string const& inKind) override {
-        auto row = mConnection->Prepare("SELECT " LINE_COLUMNS
-                                        " FROM lines WHERE kind=?1 AND (owner=?2 OR production IN "
-                                        "(SELECT production FROM access WHERE user=?2)) ORDER BY created,id");
-        row.Bind(inKind).Bind(inUser);
-        return ReadLines(row);
-    }
-
-    void PutLine(LineRecord const& inLine) override {
-        mConnection->Prepare("INSERT OR REPLACE INTO lines VALUES(?,?,?,?,?,?,?,?,?,?,?)")
-            .Bind(inLine.id)
-            .Bind(inLine.kind)
-            .Bind(inLine.parent)
-            .Bind(inLine.production)
-            .Bind(inLine.owner)
-            .Bind(inLine.baseCommit)
-            .Bind(inLine.headCommit)
-            .Bind(inLine.metadata)
-            .Bind(std::int64_t{inLine.isTemporary})
-            .Bind(inLine.created)
-            .Bind(inLine.modified)
-            .Run();
-    }
-
     bool HasGrant(std::string const& inProduction, std::string const& inUser) override {
         return mConnection->Prepare("SELECT 1 FROM access WHERE production=? AND user=?")
             .Bind(inProduction)
@@ -165,26 +103,6 @@ public:
         mConnection->Prepare("INSERT OR IGNORE INTO access VALUES(?,?)")
             .Bind(inProduction)
             .Bind(inUser)
-            .Run();
-    }
-
-    std::optional<CommitRecord> FindCommit(std::string const& inId) override {
-        auto row = mConnection->Prepare(
-            "SELECT id,production,parent,tree,title,committer,time FROM commits WHERE id=?");
-        if (!row.Bind(inId).Step())
-            return std::nullopt;
-        return ReadCommit(row);
-    }
-
-    void AddCommit(CommitRecord const& inCommit) override {
-        mConnection->Prepare("INSERT INTO commits VALUES(?,?,?,?,?,?,?)")
-            .Bind(inCommit.id)
-            .Bind(inCommit.production)
-            .Bind(inCommit.parent)
-            .Bind(inCommit.tree)
-            .Bind(inCommit.title)
-            .Bind(inCommit.committer)
-            .Bind(inCommit.time)
             .Run();
     }
 
@@ -315,14 +233,6 @@ public:
             inVisitor(row.Text(0), row.View(1));
     }
 
-    std::vector<CommitRecord> ListCommits() override {
-        auto row = mConnection->Prepare("SELECT id,production,parent,tree,title,committer,time FROM commits");
-        std::vector<CommitRecord> commits;
-        while (row.Step())
-            commits.push_back(ReadCommit(row));
-        return commits;
-    }
-
     std::string CheckIntegrity() override {
         auto row = mConnection->Prepare("PRAGMA integrity_check(20)");
         std::string findings;
@@ -333,14 +243,6 @@ public:
     }
 
 private:
-    static std::vector<LineRecord> ReadLines(Statement& inRow) {
-        std::vector<LineRecord> lines;
-        while (inRow.Step())
-            lines.push_back(ReadLine(inRow));
-        return lines;
-    }
-
-    std::unique_ptr<SqliteConnection> mConnection;
     ReturnFunction mReturn;
     bool mDone = false;
 };

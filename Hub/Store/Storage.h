@@ -35,13 +35,35 @@ public:
     virtual std::vector<LineRecord> ListLines(std::string const& inKind) = 0;
     virtual std::vector<LineRecord> ListLinesVisibleTo(std::string const& inUser,
                                                        std::string const& inKind) = 0;
+    /// The lines of that kind that stand on the parent and have not ended, oldest first.
+    virtual std::vector<LineRecord> ListLinesOn(std::string const& inParent, std::string const& inKind) = 0;
+    virtual std::vector<LineRecord> ListLinesOnOwnedBy(std::string const& inParent, std::string const& inKind,
+                                                       std::string const& inOwner) = 0;
+    /// When the line or one that stands on it was changed last; 0 for a line that does not exist.
+    virtual Micros LastModifiedOf(std::string const& inLine) = 0;
     virtual void PutLine(LineRecord const& inLine) = 0;
+    /// Removes a session or transaction, all that stands on it, and everything that only they have.
+    virtual void RemoveLine(std::string const& inId) = 0;
+
+    virtual std::vector<ConflictRecord> ListConflicts(std::string const& inSession) = 0;
+    /// The session has these conflicts afterwards and no others.
+    virtual void ReplaceConflicts(std::string const& inSession,
+                                  std::vector<ConflictRecord> const& inConflicts) = 0;
+    /// False when there is no such conflict.
+    virtual bool RemoveConflict(std::string const& inSession, std::string const& inKind,
+                                std::string const& inItem, std::string const& inName) = 0;
+
+    virtual std::vector<NoteRecord> ListNotes(std::string const& inSession) = 0;
+    virtual void PutNote(NoteRecord const& inNote) = 0;
+    virtual void RemoveNote(std::string const& inSession, std::string const& inId) = 0;
 
     virtual bool HasGrant(std::string const& inProduction, std::string const& inUser) = 0;
     virtual void Grant(std::string const& inProduction, std::string const& inUser) = 0;
 
     virtual std::optional<CommitRecord> FindCommit(std::string const& inId) = 0;
     virtual void AddCommit(CommitRecord const& inCommit) = 0;
+    /// The commits that were made on the line. Nothing may refer to them any more.
+    virtual void RemoveCommitsOf(std::string const& inLine) = 0;
 
     /// Objects are the small texts that trees are made of; content is payload. Both are found by their hash
     /// and never change.
@@ -71,6 +93,9 @@ public:
     virtual void VisitObjects(Visitor const& inVisitor) = 0;
     virtual void VisitContent(Visitor const& inVisitor) = 0;
     virtual std::vector<CommitRecord> ListCommits() = 0;
+    virtual std::vector<LineRecord> ListAllLines() = 0;
+    virtual std::vector<ConflictRecord> ListAllConflicts() = 0;
+    virtual std::vector<NoteRecord> ListAllNotes() = 0;
     /// What the database itself says of its files; empty when they are sound.
     virtual std::string CheckIntegrity() = 0;
 };
