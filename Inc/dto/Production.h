@@ -26,6 +26,8 @@ public:
     using TransferStructure::TransferStructure;
     static constexpr const char* kName = "ZOCL::dto::ClientMetadata";
     static const BindingTable& Table();
+
+    ImmutableString TransactionType() const { return String("transactionType"); }
 };
 
 class Production : public TransferStructure<Production> {
@@ -42,6 +44,7 @@ public:
     ptime Created() const { return Date("created"); }
     ptime Modified() const { return Date("modified"); }
     ProductionBaseProperties Properties() const { return Structure<ProductionBaseProperties>("properties"); }
+    ClientMetadata Metadata() const { return Structure<ClientMetadata>("metadata"); }
 
     void SetProperties(const ProductionBaseProperties& inProperties);
 };
@@ -54,10 +57,15 @@ public:
     static const BindingTable& Table();
 
     ImmutableString Identifier() const;
+    ImmutableString SessionIdentifier() const { return String("zo:sessionId"); }
     ImmutableString Owner() const { return String("zo:owner", "owner"); }
+    ImmutableString BaseCommitID() const { return String("zo:baseCommitId"); }
+    ptime Created() const { return Date("created"); }
+    ptime Modified() const { return Date("modified"); }
     ptime LastModified() const { return Date("zo:lastModified"); }
     ptime LastModifiedOfAllSessions() const { return Date("zo:lastModifiedOfAllSessions"); }
     ProductionBaseProperties Properties() const { return Structure<ProductionBaseProperties>("properties"); }
+    ClientMetadata Metadata() const { return Structure<ClientMetadata>("metadata"); }
 };
 
 /// A list of productions, sessions or transactions alike.

@@ -24,4 +24,23 @@ InterfaceRef<IZOCProduction> FindOrMakeProduction(const InterfaceRef<IZOCDataSer
     return caches ? caches->FindOrMakeProduction(inURL) : InterfaceRef<IZOCProduction>();
 }
 
+InterfaceRef<IZOCProduction> FindCachedProduction(const InterfaceRef<IZOCDataServer>& inServer,
+                                                  const ImmutableString& inURL) {
+    const auto caches = RFL::QueryInterface<ResourceCaches>(inServer);
+    return caches ? caches->GetCachedProduction(inURL) : InterfaceRef<IZOCProduction>();
+}
+
+void CacheProduction(const InterfaceRef<IZOCDataServer>& inServer,
+                     const InterfaceRef<IZOCProduction>& inProduction) {
+    if (const auto caches = RFL::QueryInterface<ResourceCaches>(inServer)) {
+        caches->CacheProduction(inProduction);
+    }
+}
+
+void ForgetCachedProduction(const InterfaceRef<IZOCDataServer>& inServer, const ImmutableString& inURL) {
+    if (const auto caches = RFL::QueryInterface<ResourceCaches>(inServer)) {
+        caches->ClearProductionFromCache(inURL);
+    }
+}
+
 }  // namespace ZOCL

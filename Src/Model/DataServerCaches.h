@@ -13,5 +13,12 @@ void ForgetCachedMediaLocator(const InterfaceRef<IZOCDataServer>& inServer, cons
 /// server without caches.
 InterfaceRef<IZOCProduction> FindOrMakeProduction(const InterfaceRef<IZOCDataServer>& inServer,
                                                   const ImmutableString& inURL);
+/// The object that the server gives out for a URL already; null when there is none.
+InterfaceRef<IZOCProduction> FindCachedProduction(const InterfaceRef<IZOCDataServer>& inServer,
+                                                  const ImmutableString& inURL);
+/// Makes a production the one that the server gives out for its URL.
+void CacheProduction(const InterfaceRef<IZOCDataServer>& inServer,
+                     const InterfaceRef<IZOCProduction>& inProduction);
+void ForgetCachedProduction(const InterfaceRef<IZOCDataServer>& inServer, const ImmutableString& inURL);
 
 }  // namespace ZOCL

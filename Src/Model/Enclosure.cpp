@@ -24,6 +24,19 @@ shared_ptr<RecycledMemory const> HeldForm(const shared_ptr<RecycledMemory const>
     return inPayload ? inPayload : RecycledMemory::Create(0);
 }
 
+bool PutTypedForm(const InterfaceRef<ServerResource>& inTarget,
+                  const shared_ptr<RecycledMemory const>& inPayload, const ImmutableString& inContentType,
+                  const Guid& inRequestID, const RequestCompletion& inCompletion) {
+    ostnet::http::FormBuilder form;
+    const std::string_view bytes = inPayload ? inPayload->view() : std::string_view();
+    if (!ostnet::http::AppendFormPart(form, EnclosurePart(), inContentType, bytes)) {
+        return false;
+    }
+    ostnet::Headers headers;
+    ostnet::http::SetFormContentTypeHeader(form, headers);
+    return inTarget->Put(ostnet::http::CompleteForm(form), headers, inRequestID, inCompletion);
+}
+
 int ResultOfPayloadRequest(int inResult, const shared_ptr<ostnet::Response>& inResponse) {
     if (inResult < 0 || (inResponse && inResponse->IsSuccess())) {
         return inResult;
@@ -32,6 +45,14 @@ int ResultOfPayloadRequest(int inResult, const shared_ptr<ostnet::Response>& inR
 }
 
 }  // namespace
+
+int Enclosure::QueryInterfaceNoAddRef(const RFL::InterfaceID& inID, void** outInterface) noexcept {
+    if (inID == kInterfaceID) {
+        *outInterface = this;
+        return kResultSuccess;
+    }
+    return Implements::QueryInterfaceNoAddRef(inID, outInterface);
+}
 
 UString Enclosure::GetEnclosurePayloadAsText() {
     return ostcore::utility::ToUTF16(GetEnclosurePayloadAsUTF8());
@@ -137,6 +158,12 @@ std::string Enclosure::GetTraceName() {
 
 bool Enclosure::PutEnclosurePayload(const shared_ptr<RecycledMemory const>& inPayload,
                                     const Guid& inRequestID, const RequestCompletion& inCompletion) {
+    return PutPayloadOfType(inPayload, ImmutableString(), inRequestID, inCompletion);
+}
+
+bool Enclosure::PutPayloadOfType(const shared_ptr<RecycledMemory const>& inPayload,
+                                 const ImmutableString& inContentType, const Guid& inRequestID,
+                                 const RequestCompletion& inCompletion) {
     const ImmutableString target = GetLinkHref(kRelation_Edit);
     if (target.empty()) {
         return false;
@@ -156,7 +183,9 @@ bool Enclosure::PutEnclosurePayload(const shared_ptr<RecycledMemory const>& inPa
             }
         };
     const auto resource = ServerResource::MakePlain(target, GetServer(), ResourceWritability::kReadOnly);
-    const bool started = resource->PutMultiPart(MakePayloadForm(inPayload), inRequestID, onPut);
+    const bool started = inContentType.empty()
+                             ? resource->PutMultiPart(MakePayloadForm(inPayload), inRequestID, onPut)
+                             : PutTypedForm(resource, inPayload, inContentType, inRequestID, onPut);
     if (!started) {
         DropPayload(payload, "Enclosure::PutEnclosurePayload");
     }

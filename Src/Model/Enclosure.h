@@ -11,6 +11,11 @@ namespace ZOCL {
 class Enclosure final : public Implements<JSONServerResource<dto::Enclosure>, Readable<IZOCEnclosure>,
                                           Writable<IZOCWritableEnclosure>> {
 public:
+    /// Answers with the object itself, for code of this floor.
+    static constexpr RFL::InterfaceID kInterfaceID{0x7a6f63456e636c6full, 0x7375726500000003ull};
+
+    int QueryInterfaceNoAddRef(const RFL::InterfaceID& inID, void** outInterface) noexcept override;
+
     UString GetEnclosurePayloadAsText() override;
     std::string GetEnclosurePayloadAsUTF8() override;
     bool LoadEnclosureData(const Guid& inRequestID, const RequestCompletion& inCompletion) override;
@@ -23,6 +28,10 @@ public:
     bool PutEnclosurePayload(const shared_ptr<RecycledMemory const>& inPayload, const Guid& inRequestID,
                              const RequestCompletion& inCompletion) override;
     bool PutEnclosurePayload(const shared_ptr<RecycledMemory const>& inPayload) override;
+    /// The asynchronous put with a content type for the payload; a null one is left out.
+    bool PutPayloadOfType(const shared_ptr<RecycledMemory const>& inPayload,
+                          const ImmutableString& inContentType, const Guid& inRequestID,
+                          const RequestCompletion& inCompletion);
 
 protected:
     std::string GetTraceName() override;
@@ -39,5 +48,11 @@ private:
 
     shared_ptr<RecycledMemory const> mPayload ZO_GUARDED_BY(IZOCDataServer::GetLock());
 };
+
+/// CreateEnclosure with a content type for the payload.
+bool CreateEnclosureOfType(const Guid& inRequestID, const ImmutableString& inFactoryURL,
+                           const InterfaceRef<IZOCDataServer>& inServer, const ImmutableString& inName,
+                           const shared_ptr<RecycledMemory const>& inPayload,
+                           const ImmutableString& inContentType, const RequestCompletion& inCompletion);
 
 }  // namespace ZOCL

@@ -48,14 +48,21 @@ bool CreateEnclosure(const Guid& inRequestID, const ImmutableString& inFactoryUR
                      const InterfaceRef<IZOCDataServer>& inServer, const ImmutableString& inName,
                      const shared_ptr<RecycledMemory const>& inPayload,
                      const RequestCompletion& inCompletion) {
+    return CreateEnclosureOfType(inRequestID, inFactoryURL, inServer, inName, inPayload,
+                                 ostnet::kHEADER_CONTENT_TYPE_APPLICATION_JSON_UTF_8, inCompletion);
+}
+
+bool CreateEnclosureOfType(const Guid& inRequestID, const ImmutableString& inFactoryURL,
+                           const InterfaceRef<IZOCDataServer>& inServer, const ImmutableString& inName,
+                           const shared_ptr<RecycledMemory const>& inPayload,
+                           const ImmutableString& inContentType, const RequestCompletion& inCompletion) {
     static const ImmutableString namePart(":name");
     static const ImmutableString enclosurePart(":enclosure");
     ostnet::http::FormBuilder form;
     const std::string_view payload = inPayload ? inPayload->view() : std::string_view();
     if (inFactoryURL.empty() ||
         !ostnet::http::AppendFormPart(form, namePart, ostnet::kHEADER_CONTENT_TYPE_TEXT_PLAIN, inName) ||
-        !ostnet::http::AppendFormPart(form, enclosurePart,
-                                      ostnet::kHEADER_CONTENT_TYPE_APPLICATION_JSON_UTF_8, payload)) {
+        !ostnet::http::AppendFormPart(form, enclosurePart, inContentType, payload)) {
         return false;
     }
     ostnet::Headers headers;

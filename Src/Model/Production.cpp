@@ -1,14 +1,18 @@
 // What a production says of itself, and what hangs on it.
 #include "Model/Production.h"
 
+#include "CollaborationFactory.h"
 #include "Model/Asset.h"
 #include "Model/AssetList.h"
+#include "Model/HistoryWalk.h"
 #include "Model/ResourceCreation.h"
 #include "Model/ServerResourceWithEnclosures.h"
+#include "Model/TransactionList.h"
 #include "ostcore/debug/Assert.h"
 #include "ostcore/debug/DebugDatabase.h"
 #include "ostcore/debug/Trace.h"
 #include "ostcore/utility/StringConversion.h"
+#include "ResourceFactory.h"
 
 namespace ZOCL {
 
@@ -58,6 +62,14 @@ ostcore::serialization::JSONValue MakeProductionCreationBody(const UString& inNa
 Production::Production() = default;
 Production::~Production() = default;
 
+int Production::QueryInterfaceNoAddRef(const RFL::InterfaceID& inID, void** outInterface) noexcept {
+    if (inID == kInterfaceID) {
+        *outInterface = this;
+        return kResultSuccess;
+    }
+    return Implements::QueryInterfaceNoAddRef(inID, outInterface);
+}
+
 void Production::PostLoadDTO() {
     const ImmutableString enclosuresLink = GetLinkHref(kRelation_Enclosures);
     const ImmutableString assetsLink = GetAssetsLink();
@@ -66,7 +78,7 @@ void Production::PostLoadDTO() {
         return;
     }
     const InterfaceRef<IZOCDataServer> server = GetServer();
-    InterfaceRef<IZOCEnclosures> enclosures = MakeAtURL<Enclosures>(enclosuresLink, server, GetWritability());
+    InterfaceRef<Enclosures> enclosures = MakeAtURL<Enclosures>(enclosuresLink, server, GetWritability());
     InterfaceRef<AssetList> assets = MakeAtURL<AssetList>(assetsLink, server, GetWritability());
     {
         ScopedLock lock(IZOCDataServer::GetLock(), "Production::PostLoadDTO");
@@ -123,6 +135,7 @@ void Production::SetProperty(std::string_view inKey, const UString& inValue, con
     if (properties.Text(inKey) != value) {
         properties.Set(inKey, value);
         mBody.SetProperties(properties);
+        mPropertiesChanged = true;
     }
 }
 
@@ -213,6 +226,21 @@ ImmutableString Production::GetAssetURL(const ImmutableString& inAssetID, const 
                           {{"{assetId}", inAssetID}, {"{commitId}", inCommit.empty() ? head : inCommit}});
 }
 
+bool Production::LoadHistoryWith(const HistoryVisitor& inVisitor, const HistoryWalkCompletion& inCompletion) {
+    return WalkHistory(GetProductionHistory(), inVisitor, inCompletion);
+}
+
+bool Production::GetMostRecentRevision(const HistoryWalkCompletion& inCompletion) {
+    const auto isNewest = [](const InterfaceRef<IZOCHistoryVersion>&, int&) { return true; };
+    return LoadHistoryWith(isNewest, inCompletion);
+}
+
+InterfaceRef<IZOCProductionHistory> Production::GetProductionHistory() {
+    CollaborationFactory* const factory = GetCompositionRoot().collaboration;
+    const ImmutableString link = GetLinkHref(kRelation_Productions_Production_History);
+    return factory && !link.empty() ? factory->MakeProductionHistory(link, GetServer()) : nullptr;
+}
+
 ImmutableString Production::GetSessionsLink() {
     return GetLinkHref(kRelation_Sessions);
 }
@@ -299,10 +327,22 @@ bool Production::UpdateProductionBaseProperties(const Guid& inRequestID,
     if (link.empty()) {
         return false;
     }
+    const InterfaceRef<Production> self(this);
+    const auto onPut = [self, inCompletion](const Guid& inID, int inResult,
+                                            const InterfaceRef<IZOCServerResource>&,
+                                            const shared_ptr<ostnet::Response>& inResponse) {
+        const ImmutableString tag = GetETagFromResponse(inResponse);
+        if (inResult >= 0 && !tag.IsNull()) {
+            self->SetETag(tag);
+        }
+        if (inCompletion) {
+            inCompletion(inID, inResult, self, inResponse);
+        }
+    };
     const auto target = ServerResource::MakePlain(link, server, ResourceWritability::kWritable);
     return target->Put(
         RecycledMemory::CreateFromBytes(ostcore::serialization::GetJSONUTF8String(properties.Body())),
-        headers, inRequestID, inCompletion);
+        headers, inRequestID, onPut);
 }
 
 std::string Production::GetTraceName() {

@@ -11,10 +11,7 @@ namespace ZOCL {
 
 using ostcore::utility::ToUTF16;
 
-namespace {
-
-/// The first of these relations that has a target.
-ImmutableString FindURL(const Links& inLinks) {
+ImmutableString FindItemURL(const Links& inLinks) {
     for (const ImmutableString& relation : {kRelation_Self, kRelation_Edit, kRelation_LatestVersion}) {
         const ImmutableString href = FindLink(inLinks, relation, ImmutableString()).href;
         if (!href.empty()) {
@@ -23,8 +20,6 @@ ImmutableString FindURL(const Links& inLinks) {
     }
     return ImmutableString();
 }
-
-}  // namespace
 
 std::vector<IZOCProductionList::Entry> ProductionList::GetAllItems() {
     const dto::Productions body = GetBody("ProductionList::GetAllItems");
@@ -38,7 +33,7 @@ std::vector<IZOCProductionList::Entry> ProductionList::GetAllItems() {
         entry.owner = item.Owner();
         entry.lastModified = item.LastModified();
         entry.lastModifiedOfAllSessions = item.LastModifiedOfAllSessions();
-        entry.url = FindURL(item.GetLinks());
+        entry.url = FindItemURL(item.GetLinks());
         entries.push_back(std::move(entry));
     }
     return entries;

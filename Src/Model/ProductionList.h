@@ -20,4 +20,7 @@ public:
     InterfaceRef<IZOCProductionList> GetNextPage() override;
 };
 
+/// Where an item of a list leads: the first of "self", "edit" and "latest-version" that has a target.
+ImmutableString FindItemURL(const Links& inLinks);
+
 }  // namespace ZOCL

@@ -6,8 +6,12 @@
 
 #include "ZOClient/IZOCAsset.h"
 #include "ZOClient/IZOCEnclosure.h"
+#include "ZOClient/IZOCProductionHistory.h"
 
 namespace ZOCL {
+
+class IZOCEditingSession;
+class IZOCProductionList;
 
 /// A production, an editing session on one, or a transaction on a session: its links tell which.
 /// Accessors read the loaded body and make no request; setters change the object alone.
@@ -32,8 +36,24 @@ public:
     /// The URL of an asset at a commit; an empty commit stands for the newest. Null without the link.
     virtual ImmutableString GetAssetURL(const ImmutableString& inAssetID,
                                         const ImmutableString& inCommit) = 0;
+    /// Reads the history for its newest version; kResultHTTPNotFound for an empty one. False without the
+    /// link.
+    virtual bool GetMostRecentRevision(const HistoryWalkCompletion& inCompletion) = 0;
+    /// Loads the history page by page and shows each version to the visitor, newest first, until it ends the
+    /// walk; kResultHTTPNotFound and null when nothing is left. The completion runs once, on a worker. False
+    /// without the link.
+    virtual bool LoadHistoryWith(const HistoryVisitor& inVisitor,
+                                 const HistoryWalkCompletion& inCompletion) = 0;
+    /// Blocks. Gives the session of this user, loaded: without inIsTemporary one that exists already, else a
+    /// new one. False and null when there is none to be had; the reason is traced.
+    virtual bool CreateEditingSession(InterfaceRef<IZOCEditingSession>& outSession, const UString& inName,
+                                      const UString& inDescription, bool inIsTemporary) = 0;
+    /// A new, unloaded list of this production's sessions; null without the link.
+    virtual InterfaceRef<IZOCProductionList> GetEditingSessions() = 0;
     /// The href behind which the editing sessions stand, null without it.
     virtual ImmutableString GetSessionsLink() = 0;
+    /// New, unloaded; null without the link.
+    virtual InterfaceRef<IZOCProductionHistory> GetProductionHistory() = 0;
     /// Blocks: loads the latest version of this production; its commit, null on failure.
     virtual ImmutableString GetMostRecentRevision() = 0;
     /// The commit of the loaded body.
@@ -43,6 +63,8 @@ public:
     virtual bool Copy(const Guid& inRequestID, const RequestCompletion& inCompletion, const UString& inName,
                       const UString& inDescription, bool inIsTemporary) = 0;
 
+    /// False when the link to the sessions is missing.
+    virtual bool GetEditingSessionFactoryURL(ImmutableString& outURL) = 0;
     /// Not-a-date-time when the server gave none. In UTC.
     virtual ptime GetCreationTime() = 0;
     virtual ptime GetModificationTime() = 0;
