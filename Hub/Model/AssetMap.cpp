@@ -2,6 +2,7 @@
 // of the 16 next digits of the identifier's hash.
 #include "Model/AssetMap.h"
 
+#include <algorithm>
 #include <array>
 #include <charconv>
 #include <stdexcept>
@@ -165,6 +166,69 @@ private:
     Transaction& mTransaction;
 };
 
+class Comparer {
+public:
+    explicit Comparer(Transaction& inTransaction) : mNodes(inTransaction) {}
+
+    void Compare(std::string const& inLeft, std::string const& inRight) {
+        if (inLeft == inRight)
+            return;
+        Node const left = Load(inLeft);
+        Node const right = Load(inRight);
+        if (left.isFork && right.isFork) {
+            for (std::size_t digit = 0; digit < left.branches.size(); ++digit)
+                Compare(HashOf(left.branches[digit]), HashOf(right.branches[digit]));
+            return;
+        }
+        // A leaf against a fork: the fork has more than a leaf can hold, so most of it differs anyway.
+        CompareEntries(EntriesOf(left), EntriesOf(right));
+    }
+
+    AssetMap::Comparison Finish() {
+        std::sort(mFound.differences.begin(), mFound.differences.end(),
+                  [](auto const& inLeft, auto const& inRight) { return inLeft.id < inRight.id; });
+        return std::move(mFound);
+    }
+
+private:
+    using Entries = std::map<std::string, std::string>;
+
+    static std::string HashOf(Branch const& inBranch) {
+        return inBranch.count ? inBranch.hash : std::string();
+    }
+
+    Node Load(std::string const& inHash) {
+        if (inHash.empty())
+            return {};
+        ++mFound.nodesRead;
+        return mNodes.Load(inHash);
+    }
+
+    Entries EntriesOf(Node const& inNode) {
+        Entries entries = inNode.entries;
+        for (auto const& branch : inNode.branches)
+            if (branch.count != 0)
+                entries.merge(EntriesOf(Load(branch.hash)));
+        return entries;
+    }
+
+    void CompareEntries(Entries const& inLeft, Entries const& inRight) {
+        for (auto const& [id, hash] : inLeft) {
+            auto const other = inRight.find(id);
+            if (other == inRight.end())
+                mFound.differences.push_back({id, hash, ""});
+            else if (other->second != hash)
+                mFound.differences.push_back({id, hash, other->second});
+        }
+        for (auto const& [id, hash] : inRight)
+            if (!inLeft.count(id))
+                mFound.differences.push_back({id, "", hash});
+    }
+
+    Writer const mNodes;
+    AssetMap::Comparison mFound;
+};
+
 }  // namespace
 
 AssetMap::AssetMap(Transaction& inTransaction, std::string inRoot)
@@ -200,6 +264,12 @@ AssetMap::Written AssetMap::Apply(Changes const& inChanges) const {
         steps.push_back({&id, &state, Sha256Hex(id)});
     Branch const root = Writer(mTransaction).Apply(mRoot, steps, 0);
     return {root.count ? root.hash : std::string(), root.count};
+}
+
+AssetMap::Comparison AssetMap::CompareTo(AssetMap const& inRight) const {
+    Comparer comparer(mTransaction);
+    comparer.Compare(mRoot, inRight.mRoot);
+    return comparer.Finish();
 }
 
 }  // namespace zohub

@@ -10,6 +10,7 @@
 #include <map>
 #include <optional>
 #include <string>
+#include <vector>
 
 #include "Store/Storage.h"
 
@@ -34,6 +35,21 @@ public:
 
     /// Writes the map with the changes applied; this object keeps showing the old one.
     Written Apply(Changes const& inChanges) const;
+
+    /// An asset whose states differ between two maps; an empty hash says that it is not there.
+    struct Difference {
+        std::string id;
+        std::string left;
+        std::string right;
+    };
+
+    struct Comparison {
+        std::vector<Difference> differences;  ///< by identifier
+        std::uint64_t nodesRead = 0;          ///< what it cost: parts that are equal are never looked at
+    };
+
+    /// This map is the left one.
+    Comparison CompareTo(AssetMap const& inRight) const;
 
 private:
     Transaction& mTransaction;

@@ -1,8 +1,8 @@
 // What differs between two trees, told item by item, and which commit changed an item last.
 //
-// The items are: an asset (that it exists, its properties, its renditions), each enclosure by its name, and the
-// properties of the production. Two items are equal when a client would see the same: the identifier under
-// which the hub keeps an enclosure, the order of a list and the order of keys do not count.
+// The items are: an asset (that it exists, its properties, its renditions), each enclosure by its name, and
+// the properties of the production. Two items are equal when a client would see the same: the identifier
+// under which the hub keeps an enclosure, the order of a list and the order of keys do not count.
 #pragma once
 
 #include <compare>
@@ -58,7 +58,8 @@ enum class ChangeType { Added, Updated, Removed };
 struct AssetChange {
     ChangeType type = ChangeType::Updated;
     std::string id;
-    std::string name;  ///< on the right side; of a removed asset, on the left one
+    std::string name;      ///< on the right side; of a removed asset, on the left one
+    std::string leftHash;  ///< of its state on the left side; empty for an added asset
 };
 
 struct EnclosureChange {
@@ -92,9 +93,9 @@ struct Change {
     Micros time = 0;
 };
 
-/// For the entries of the differences, the last commit of the right side that changed each. The walk goes from
-/// inRight towards the past and ends at inLeftCommit, when all are found, or after a bounded number of commits;
-/// what was not found by then is absent.
+/// For the entries of the differences, the last commit of the right side that changed each. The walk goes
+/// from inRight towards the past and ends at inLeftCommit, when all are found, or after a bounded number of
+/// commits; what was not found by then is absent.
 std::map<ChangedItem, Change> FindLastChanges(Transaction& inTransaction, TreeDiff const& inDiff,
                                               CommitRecord const& inRight, std::string const& inLeftCommit);
 

@@ -24,10 +24,10 @@ enum class MergeStrategy {
 };
 
 struct MergeInput {
-    TreeRoot base;           ///< what both sides come from
-    TreeRoot theirs;         ///< the commit that is pulled
-    TreeRoot mine;           ///< the session
-    std::string baseCommit;  ///< the commit of the base tree; conflicts that are new name it
+    TreeRoot base;                     ///< what both sides come from
+    TreeRoot theirs;                   ///< the commit that is pulled
+    TreeRoot mine;                     ///< the session
+    std::string baseCommit;            ///< the commit of the base tree; conflicts that are new name it
     std::vector<ConflictRecord> open;  ///< the session's conflicts before the merge
     MergeStrategy strategy = MergeStrategy::Keep;
     std::string referencesOf;  ///< the line under which states that neither side has are listed
@@ -43,9 +43,9 @@ struct MergeResult {
 /// Stores the asset states that are new; the tree itself is the caller's to store, with its commit.
 MergeResult MergeTrees(Transaction& inTransaction, MergeInput const& inInput);
 
-/// The conflicts that are left when a session with these conflicts has the tree inMine: those whose sides have
-/// become equal are closed, and those of an asset that one side no longer has become one. To be called whenever
-/// the tree of a session with conflicts changes. inTheirs is the tree of the session's base commit.
+/// The conflicts that are left when a session with these conflicts has the tree inMine: those whose sides
+/// have become equal are closed, and those of an asset that one side no longer has become one. To be called
+/// whenever the tree of a session with conflicts changes. inTheirs is the tree of the session's base commit.
 std::vector<ConflictRecord> OpenConflicts(Transaction& inTransaction, TreeRoot const& inTheirs,
                                           TreeRoot const& inMine,
                                           std::vector<ConflictRecord> const& inConflicts);
