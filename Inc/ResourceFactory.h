@@ -38,11 +38,13 @@ public:
 };
 
 class CollaborationFactory;
+class PollCancellation;
 
 /// What the composition root puts in place; each pointer is null before Initialize and after Shutdown.
 struct CompositionRoot {
     ResourceFactory* resources = nullptr;
     CollaborationFactory* collaboration = nullptr;
+    PollCancellation* polls = nullptr;
 };
 /// Written by Initialize and Shutdown on the main thread only, read anywhere between the two.
 CompositionRoot& GetCompositionRoot();

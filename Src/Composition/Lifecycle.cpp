@@ -6,7 +6,9 @@
 #include "Model/ModelResourceFactory.h"
 #include "ostcore/threads/MainThread.h"
 #include "ostnet/http/NetworkProcessor.h"
+#include "PollCancellation.h"
 #include "ResourceFactory.h"
+#include "Resources/PollingResourceMonitor.h"
 #include "RFL/Registry.h"
 #include "ZOClient/Library.h"
 
@@ -28,6 +30,7 @@ void Initialize() {
     RegisterStation();
     GetCompositionRoot().resources = GetModelResourceFactory();
     GetCompositionRoot().collaboration = GetCollaborationFactory();
+    GetCompositionRoot().polls = GetPollCancellation();
 }
 
 void Shutdown() {
@@ -35,10 +38,13 @@ void Shutdown() {
         return;
     }
     ResetSyslogLogger();
+    // Before the network goes, which the polls use.
+    PollingResourceMonitor::CancelAllOutstandingPolls(true);
     // The network's last completions still make resources, so the factory goes after it.
     ostnet::Shutdown();
     GetCompositionRoot().resources = nullptr;
     GetCompositionRoot().collaboration = nullptr;
+    GetCompositionRoot().polls = nullptr;
     // Last, since whatever ran until here may have remembered something.
     RFL::CloseRegistry();
 }

@@ -3,6 +3,8 @@
 #include "Connection/LoggedInServer.h"
 #include "Frame/Station.h"
 #include "ostcore/debug/Trace.h"
+#include "PollCancellation.h"
+#include "ResourceFactory.h"
 #include "ZOClient/Messages.h"
 #include "ZOClient/Registry.h"
 
@@ -97,6 +99,9 @@ void IZOCDataServer::CancelConnectRequest(const Guid& inRequestID) {
 }
 
 void IZOCDataServer::Terminate(bool inEndSession) {
+    if (PollCancellation* const polls = GetCompositionRoot().polls) {
+        polls->CancelAllOutstandingPolls();
+    }
     const InterfaceRef<DataServer> server = RFL::QueryInterface<DataServer>(ExchangeLoggedInServer(nullptr));
     const ImmutableString token = server ? server->GetLoginData().token : ImmutableString();
     if (server) {

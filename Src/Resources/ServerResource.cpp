@@ -5,6 +5,7 @@
 #include "ostcore/debug/Trace.h"
 #include "ostnet/HeaderConstants.h"
 #include "Resources/JoinText.h"
+#include "Resources/PollingResourceMonitor.h"
 
 namespace ZOCL {
 
@@ -243,6 +244,13 @@ shared_ptr<RecycledMemory const> ServerResource::GetResponseData() {
 bool ServerResource::TryToCancelRequest(const Guid& inRequestID) {
     GetServer()->TryToCancelRequest(inRequestID);
     return true;
+}
+
+shared_ptr<ServerResourceChangeNotifier> ServerResource::SubscribeToChanges(
+    const ServerResourceChangeNotifier::Function& inFunction, bool inNotifyWhenUnloaded,
+    std::uint32_t inIntervalMilliseconds) {
+    return PollingResourceMonitor::Get().SubscribeToChanges(GetSelf(), inFunction, inIntervalMilliseconds,
+                                                            inNotifyWhenUnloaded);
 }
 
 InterfaceRef<ServerResource> ServerResource::GetSelf() {

@@ -54,6 +54,9 @@ public:
     ImmutableString GetETag(bool inNoFetch) override;
     shared_ptr<RecycledMemory const> GetResponseData() override;
     bool TryToCancelRequest(const Guid& inRequestID) override;
+    shared_ptr<ServerResourceChangeNotifier> SubscribeToChanges(
+        const ServerResourceChangeNotifier::Function& inFunction, bool inNotifyWhenUnloaded,
+        std::uint32_t inIntervalMilliseconds) override;
 
     /// HTTP 404 reaches the completion as kResultGone: what was to be deleted is not there.
     bool Delete(const Guid& inRequestID, const RequestCompletion& inCompletion) override;

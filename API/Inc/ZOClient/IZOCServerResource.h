@@ -3,6 +3,7 @@
 
 #include "ZOClient/Export.h"
 #include "ZOClient/ResultCodes.h"
+#include "ZOClient/ServerResourceChangeNotifier.h"
 #include "ZOClient/Types.h"
 
 namespace ZOCL {
@@ -56,6 +57,13 @@ public:
     virtual shared_ptr<RecycledMemory const> GetResponseData() = 0;
     /// A request only: what was started still completes.
     virtual bool TryToCancelRequest(const Guid& inRequestID) = 0;
+    /// Asks for the latest version every so many milliseconds, and calls the function whenever the tag has
+    /// moved, at once when it already has. Without inNotifyWhenUnloaded a failed request is no news. The
+    /// caller stops watching with StopNotifications of the result, which it keeps until then. Null: nobody
+    /// watches.
+    virtual shared_ptr<ServerResourceChangeNotifier> SubscribeToChanges(
+        const function<void(const InterfaceRef<IZOCServerResource>& inResource)>& inFunction,
+        bool inNotifyWhenUnloaded, std::uint32_t inIntervalMilliseconds) = 0;
 };
 
 /// Write side; only a resource that was made writable answers the query for it.

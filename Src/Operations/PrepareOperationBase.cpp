@@ -1,0 +1,64 @@
+// Operations with several requests in flight.
+#include "Operations/PrepareOperationBase.h"
+
+#include <algorithm>
+
+#include "ZOClient/IZOCDataServer.h"
+
+namespace ZOCL {
+
+using ostcore::threads::ScopedLock;
+
+ZOPrepareOperationBase::ZOPrepareOperationBase() = default;
+ZOPrepareOperationBase::~ZOPrepareOperationBase() = default;
+
+int ZOPrepareOperationBase::QueryInterfaceNoAddRef(const RFL::InterfaceID& inID,
+                                                   void** outInterface) noexcept {
+    if (inID == RFL::IThreadedQueueRequest::kInterfaceID) {
+        *outInterface = static_cast<RFL::IThreadedQueueRequest*>(this);
+        return kResultSuccess;
+    }
+    return ZOOperationBase::QueryInterfaceNoAddRef(inID, outInterface);
+}
+
+bool ZOPrepareOperationBase::Start() {
+    mExecutor = ostcore::threads::CreateIOBoundExecutor("prepare operation");
+    const InterfaceRef<ZOPrepareOperationBase> self(this);
+    return mExecutor && mExecutor->Post([self] { self->Run(); });
+}
+
+void ZOPrepareOperationBase::Abort() {
+    ZOOperationBase::Abort();
+    std::vector<Guid> pending;
+    {
+        ScopedLock lock(mRequestLock, "ZOPrepareOperationBase::Abort");
+        pending = mPendingRequests;
+    }
+    const InterfaceRef<IZOCDataServer> server = IZOCDataServer::GetLoggedInServerRef();
+    if (!server) {
+        return;
+    }
+    for (const Guid& request : pending) {
+        server->TryToCancelRequest(request);
+    }
+}
+
+void ZOPrepareOperationBase::AddPendingRequest(const Guid& inRequestID) {
+    ScopedLock lock(mRequestLock, "ZOPrepareOperationBase::AddPendingRequest");
+    mPendingRequests.push_back(inRequestID);
+}
+
+unsigned ZOPrepareOperationBase::RemovePendingRequest(const Guid& inRequestID) {
+    ScopedLock lock(mRequestLock, "ZOPrepareOperationBase::RemovePendingRequest");
+    const auto found = std::find(mPendingRequests.begin(), mPendingRequests.end(), inRequestID);
+    if (found != mPendingRequests.end()) {
+        mPendingRequests.erase(found);
+    }
+    return ++mCompletedRequests;
+}
+
+void ZOPrepareOperationBase::Finish() {
+    FinishOperation(GetStoredResult());
+}
+
+}  // namespace ZOCL
