@@ -1,10 +1,13 @@
-// Blocks of bytes with zeroed padding; large ones go through a bounded free list.
+// Blocks of bytes with zeroed padding; all but the smallest go through bounded free lists.
 #include "ostcore/utility/RecycledMemory.h"
 
+#include <array>
+#include <bit>
 #include <cstdlib>
 #include <cstring>
 #include <limits>
 #include <new>
+#include <utility>
 
 #include "ostcore/threads/Mutex.h"
 
@@ -16,6 +19,8 @@ using threads::Mutex;
 using threads::MutexLock;
 
 constexpr std::size_t kPageSize = 4096;
+constexpr std::size_t kMediumBlock = 1024;
+constexpr std::size_t kMediumKeptInAll = 2 * 1024 * 1024;
 constexpr std::size_t kLargeBlock = 64 * 1024;
 constexpr std::size_t kLargestKept = 16 * 1024 * 1024;
 constexpr std::size_t kKeptInAll = 64 * 1024 * 1024;
@@ -63,6 +68,63 @@ FreeList& LargeBlocks() {
     return *list;
 }
 
+// Sizes of medium blocks: four steps to each power of two.
+constexpr std::size_t kStepsPerDoubling = 4;
+
+std::size_t RoundMedium(std::size_t inBytes) {
+    const std::size_t step = std::bit_floor(inBytes - 1) / kStepsPerDoubling;
+    return (inBytes + step - 1) / step * step;
+}
+
+// The number of a rounded size, from 0 for the smallest.
+std::size_t MediumClass(std::size_t inRounded) {
+    const auto doublings = static_cast<std::size_t>(std::bit_width((inRounded - 1) / kMediumBlock)) - 1;
+    const std::size_t step = (kMediumBlock << doublings) / kStepsPerDoubling;
+    return doublings * kStepsPerDoubling + (inRounded - (kMediumBlock << doublings)) / step - 1;
+}
+
+/// Medium blocks that wait for their next use. Payloads are filled on one thread and let go on another, which
+/// the allocator pays for with its arena's lock and with tidying up; a list for each size costs neither.
+class MediumBlocks {
+public:
+    char* Take(std::size_t inRounded) ZO_EXCLUDES(mMutex) {
+        Block*& first = mFirst[MediumClass(inRounded)];
+        MutexLock lock(mMutex);
+        if (!first) {
+            return nullptr;
+        }
+        mKept -= inRounded;
+        Block* const block = std::exchange(first, first->next);
+        return static_cast<char*>(static_cast<void*>(block));
+    }
+    bool Keep(char* inBlock, std::size_t inRounded) noexcept ZO_EXCLUDES(mMutex) {
+        Block*& first = mFirst[MediumClass(inRounded)];
+        MutexLock lock(mMutex);
+        if (mKept + inRounded > kMediumKeptInAll) {
+            return false;
+        }
+        mKept += inRounded;
+        first = ::new (static_cast<void*>(inBlock)) Block{first};
+        return true;
+    }
+
+private:
+    struct Block {
+        Block* next;
+    };
+    static constexpr std::size_t kClasses =
+        kStepsPerDoubling * (std::bit_width(kLargeBlock / kMediumBlock) - 1);
+
+    Mutex mMutex;
+    std::array<Block*, kClasses> mFirst{};
+    std::size_t mKept ZO_GUARDED_BY(mMutex) = 0;
+};
+
+MediumBlocks& Mediums() {
+    static MediumBlocks* const blocks = new MediumBlocks;
+    return *blocks;
+}
+
 std::size_t WithPadding(std::size_t inCapacity) {
     if (inCapacity > std::numeric_limits<std::size_t>::max() / 2) {
         throw std::bad_alloc();
@@ -81,9 +143,14 @@ std::size_t RoundLarge(std::size_t inBytes) {
 
 // Returns a block of outBytes, at least what was asked for.
 char* AllocateBlock(std::size_t inBytes, std::size_t& outBytes) {
-    if (inBytes < kLargeBlock) {
+    if (inBytes <= kMediumBlock) {
         outBytes = inBytes;
         return static_cast<char*>(::operator new(inBytes));
+    }
+    if (inBytes <= kLargeBlock) {
+        outBytes = RoundMedium(inBytes);
+        char* const kept = Mediums().Take(outBytes);
+        return kept ? kept : static_cast<char*>(::operator new(outBytes));
     }
     const std::size_t rounded = RoundLarge(inBytes);
     if (char* kept = LargeBlocks().Take(rounded, outBytes)) {
@@ -98,8 +165,10 @@ char* AllocateBlock(std::size_t inBytes, std::size_t& outBytes) {
 }
 
 void FreeBlock(char* inBlock, std::size_t inBytes) noexcept {
-    if (inBytes < kLargeBlock) {
-        ::operator delete(inBlock);
+    if (inBytes <= kLargeBlock) {
+        if (inBytes <= kMediumBlock || !Mediums().Keep(inBlock, inBytes)) {
+            ::operator delete(inBlock);
+        }
     } else if (!LargeBlocks().Keep(inBlock, inBytes)) {
         std::free(inBlock);
     }

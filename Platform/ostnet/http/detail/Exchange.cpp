@@ -12,6 +12,7 @@ using ostcore::utility::EqualsIgnoreCaseASCII;
 /// A stated length is believed up to here; a longer body gets its room when this much has really come.
 constexpr std::size_t kBelievedLength = 16u << 20;
 constexpr std::size_t kFirstRoom = 16u << 10;
+constexpr std::size_t kUsualHeadSize = 512;
 
 constexpr std::string_view kAcceptEncoding = "Accept-Encoding";
 
@@ -40,7 +41,7 @@ int OnAboutToSendFromEngine(void* inExchange, char*, char*, int, int) {
 
 void SetVerb(CURL* ioHandle, Verb inVerb, const RecycledMemory* inPayload) {
     if (HasBody(inVerb)) {
-        const std::string_view bytes = inPayload ? inPayload->view() : std::string_view("", 0);
+        const std::string_view bytes = inPayload ? inPayload->view() : std::string_view("");
         curl_easy_setopt(ioHandle, CURLOPT_POSTFIELDS, bytes.data());
         curl_easy_setopt(ioHandle, CURLOPT_POSTFIELDSIZE_LARGE, static_cast<curl_off_t>(bytes.size()));
         curl_easy_setopt(ioHandle, CURLOPT_POST, 1L);
@@ -138,23 +139,29 @@ void HeaderLines::Link() {
 Exchange::Exchange(Request inRequest, const Headers& inHeaders, CompletionFunction inCompletion)
     : mRequest(std::move(inRequest)),
       mHeaderLines(inHeaders, mRequest.verb),
-      mCompletion(std::move(inCompletion)) {}
+      mCompletion(std::move(inCompletion)),
+      mBody(RecycledMemory::Create(0)) {
+    mHead.reserve(kUsualHeadSize);
+}
+
+void Exchange::PrepareHandle(CURL* ioHandle, bool inIsSecure) {
+    // HTTP/2 is agreed on within TLS only; there a request waits for a connection that it may share.
+    curl_easy_setopt(ioHandle, CURLOPT_HTTP_VERSION,
+                     static_cast<long>(inIsSecure ? CURL_HTTP_VERSION_2TLS : CURL_HTTP_VERSION_1_1));
+    curl_easy_setopt(ioHandle, CURLOPT_PIPEWAIT, inIsSecure ? 1L : 0L);
+    curl_easy_setopt(ioHandle, CURLOPT_HEADERFUNCTION, &OnHeadLineFromEngine);
+    curl_easy_setopt(ioHandle, CURLOPT_WRITEFUNCTION, &OnBodyFromEngine);
+    curl_easy_setopt(ioHandle, CURLOPT_PREREQFUNCTION, &OnAboutToSendFromEngine);
+}
 
 void Exchange::Attach(CURL* inHandle, Clock::time_point inNow) {
     mHandle = inHandle;
     mSpanStart = inNow;
     curl_easy_setopt(inHandle, CURLOPT_URL, mRequest.url.c_str());
-    // HTTP/2 is agreed on within TLS only; there a request waits for a connection that it may share.
-    curl_easy_setopt(inHandle, CURLOPT_HTTP_VERSION,
-                     static_cast<long>(mRequest.isSecure ? CURL_HTTP_VERSION_2TLS : CURL_HTTP_VERSION_1_1));
-    curl_easy_setopt(inHandle, CURLOPT_PIPEWAIT, mRequest.isSecure ? 1L : 0L);
     curl_easy_setopt(inHandle, CURLOPT_HTTPHEADER, mHeaderLines.First());
     curl_easy_setopt(inHandle, CURLOPT_PRIVATE, this);
-    curl_easy_setopt(inHandle, CURLOPT_HEADERFUNCTION, &OnHeadLineFromEngine);
     curl_easy_setopt(inHandle, CURLOPT_HEADERDATA, this);
-    curl_easy_setopt(inHandle, CURLOPT_WRITEFUNCTION, &OnBodyFromEngine);
     curl_easy_setopt(inHandle, CURLOPT_WRITEDATA, this);
-    curl_easy_setopt(inHandle, CURLOPT_PREREQFUNCTION, &OnAboutToSendFromEngine);
     curl_easy_setopt(inHandle, CURLOPT_PREREQDATA, this);
     SetVerb(inHandle, mRequest.verb, mRequest.payload.get());
 }
@@ -273,9 +280,6 @@ std::size_t Exchange::OnBody(std::string_view inBytes) {
 /// A body of unknown length gets all that it may fill at once when it has become long: the system lends pages
 /// as they are written, and a long body is never copied, so that it is never held twice.
 void Exchange::MakeRoom(std::size_t inMore) {
-    if (!mBody) {
-        mBody = RecycledMemory::Create(0);
-    }
     const std::size_t needed = mBody->size() + inMore;
     if (needed <= mRoom) {
         return;
@@ -292,7 +296,7 @@ void Exchange::MakeRoom(std::size_t inMore) {
 }
 
 void Exchange::DropSpareRoom() {
-    if (!mBody || mResult != CURLE_OK) {
+    if (mRoom == 0 || mResult != CURLE_OK) {
         mBody.reset();
         return;
     }

@@ -65,6 +65,9 @@ public:
     /// For the owner of the completion: hands it over, and leaves none.
     CompletionFunction TakeCompletion() noexcept { return std::exchange(mCompletion, CompletionFunction()); }
 
+    /// Sets what is the same for all exchanges of one kind, once for a handle that serves many.
+    static void PrepareHandle(CURL* ioHandle, bool inIsSecure);
+
     // On the network thread, in this order.
     void Attach(CURL* inHandle, Clock::time_point inNow);
     /// Not CURLE_OK when a deadline has passed.
@@ -118,6 +121,7 @@ private:
     bool mIsChunked = false;
     std::optional<std::uint64_t> mStatedLength;
 
+    // Made with the exchange, on the caller's thread: they are let go on a worker, not on the network thread.
     shared_ptr<RecycledMemory> mBody;
     std::size_t mRoom = 0;
 

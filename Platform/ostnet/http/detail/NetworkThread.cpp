@@ -76,6 +76,14 @@ void PrepareTrust(CURL* ioHandle, const NetworkSettings& inSettings) {
     }
 }
 
+bool HasProxyVariable() {
+    constexpr const char* kNames[] = {"http_proxy", "https_proxy", "HTTPS_PROXY", "all_proxy", "ALL_PROXY"};
+    return std::any_of(std::begin(kNames), std::end(kNames), [](const char* inName) {
+        const char* const value = std::getenv(inName);
+        return value && *value;
+    });
+}
+
 /// Sets all options that do not change from request to request.
 void Prepare(CURL* ioHandle, const NetworkSettings& inSettings) {
     curl_easy_setopt(ioHandle, CURLOPT_NOSIGNAL, 1L);
@@ -94,6 +102,8 @@ void Prepare(CURL* ioHandle, const NetworkSettings& inSettings) {
     if (!inSettings.proxy.empty()) {
         curl_easy_setopt(ioHandle, CURLOPT_PROXY, inSettings.proxy.c_str());
         curl_easy_setopt(ioHandle, CURLOPT_NOPROXY, inSettings.noProxy.c_str());
+    } else if (!HasProxyVariable()) {
+        curl_easy_setopt(ioHandle, CURLOPT_PROXY, "");  // spares the engine its look for each request
     }
     PrepareTrust(ioHandle, inSettings);
 }
@@ -357,7 +367,7 @@ void NetworkThread::BeginTransfer(std::shared_ptr<Exchange> inExchange) {
         mSweepEvery = sweep;
         mNextSweep = now + mSweepEvery;
     }
-    const IdleHandle idle = TakeHandle(settings);
+    const IdleHandle idle = TakeHandle(inExchange->GetRequest());
     if (!idle.handle) {
         inExchange->Fail(CURLE_OUT_OF_MEMORY);
         mEndedExchanges.push_back(std::move(inExchange));
@@ -365,11 +375,12 @@ void NetworkThread::BeginTransfer(std::shared_ptr<Exchange> inExchange) {
     }
     inExchange->Attach(idle.handle, now);
     Transfer& transfer = mTransfers[idle.handle];
-    transfer = {this, std::move(inExchange), idle.preparedFor};
-    const bool isObserved = transfer.exchange->GetRequest().options.observer != nullptr;
-    curl_easy_setopt(idle.handle, CURLOPT_NOPROGRESS, isObserved ? 0L : 1L);
-    curl_easy_setopt(idle.handle, CURLOPT_XFERINFOFUNCTION, &NetworkThread::OnTransferProgress);
-    curl_easy_setopt(idle.handle, CURLOPT_XFERINFODATA, &transfer);
+    const bool isObserved = inExchange->GetRequest().options.observer != nullptr;
+    transfer = {this, std::move(inExchange), idle.preparedFor, isObserved};
+    if (isObserved) {
+        curl_easy_setopt(idle.handle, CURLOPT_NOPROGRESS, 0L);
+        curl_easy_setopt(idle.handle, CURLOPT_XFERINFODATA, &transfer);
+    }
     if (curl_multi_add_handle(mMulti, idle.handle) != CURLM_OK) {
         EndTransfer(idle.handle, CURLE_FAILED_INIT);
     }
@@ -395,11 +406,16 @@ void NetworkThread::EndTransfer(CURL* inHandle, CURLcode inResult) {
     Transfer transfer = std::move(found->second);
     curl_multi_remove_handle(mMulti, inHandle);
     mTransfers.erase(found);
-    KeepHandle({transfer.exchange->Detach(inResult), std::move(transfer.preparedFor)});
+    if (transfer.isObserved) {
+        curl_easy_setopt(inHandle, CURLOPT_NOPROGRESS, 1L);
+    }
+    const bool isForTLS = transfer.exchange->GetRequest().isSecure;
+    KeepHandle({transfer.exchange->Detach(inResult), std::move(transfer.preparedFor), isForTLS});
     mEndedExchanges.push_back(std::move(transfer.exchange));
 }
 
-NetworkThread::IdleHandle NetworkThread::TakeHandle(const shared_ptr<NetworkSettings const>& inSettings) {
+NetworkThread::IdleHandle NetworkThread::TakeHandle(const Request& inRequest) {
+    const auto& settings = inRequest.settings;
     IdleHandle idle{nullptr, nullptr};
     if (!mIdleHandles.empty()) {
         idle = std::move(mIdleHandles.back());
@@ -407,14 +423,17 @@ NetworkThread::IdleHandle NetworkThread::TakeHandle(const shared_ptr<NetworkSett
     } else {
         idle.handle = curl_easy_init();
     }
-    if (idle.handle && idle.preparedFor != inSettings) {
+    if (idle.handle && (idle.preparedFor != settings || idle.isForTLS != inRequest.isSecure)) {
         curl_easy_reset(idle.handle);
-        Prepare(idle.handle, *inSettings);
+        Prepare(idle.handle, *settings);
+        Exchange::PrepareHandle(idle.handle, inRequest.isSecure);
+        curl_easy_setopt(idle.handle, CURLOPT_NOPROGRESS, 1L);
+        curl_easy_setopt(idle.handle, CURLOPT_XFERINFOFUNCTION, &NetworkThread::OnTransferProgress);
         curl_easy_setopt(idle.handle, CURLOPT_OPENSOCKETFUNCTION, &NetworkThread::OnOpenSocket);
         curl_easy_setopt(idle.handle, CURLOPT_OPENSOCKETDATA, this);
         curl_easy_setopt(idle.handle, CURLOPT_CLOSESOCKETFUNCTION, &NetworkThread::OnCloseSocket);
         curl_easy_setopt(idle.handle, CURLOPT_CLOSESOCKETDATA, this);
-        idle.preparedFor = inSettings;
+        idle.preparedFor = settings;
     }
     return idle;
 }

@@ -62,6 +62,7 @@ private:
         NetworkThread* owner = nullptr;
         std::shared_ptr<Exchange> exchange;
         shared_ptr<NetworkSettings const> preparedFor;
+        bool isObserved = false;
     };
     struct Socket {
         bool isConnection = false;
@@ -71,6 +72,7 @@ private:
     struct IdleHandle {
         CURL* handle;
         shared_ptr<NetworkSettings const> preparedFor;
+        bool isForTLS = false;
     };
 
     void Run();
@@ -89,7 +91,7 @@ private:
     void BeginTransfer(std::shared_ptr<Exchange> inExchange);
     void DropExchange(const std::shared_ptr<Exchange>& inExchange);
     void EndTransfer(CURL* inHandle, CURLcode inResult);
-    IdleHandle TakeHandle(const shared_ptr<NetworkSettings const>& inSettings);
+    IdleHandle TakeHandle(const Request& inRequest);
     void KeepHandle(IdleHandle inHandle);
     bool Give(std::shared_ptr<Exchange> inExchange, Exchanges Orders::*inList);
     void Wake() noexcept;
