@@ -43,7 +43,7 @@ public:
         StartMore();
         mContext.Loop().Wait();
         if (mFailure) {
-            throw *mFailure;
+            throw Failure(*mFailure);
         }
     }
 

@@ -56,11 +56,9 @@ Failure Failure::OfRequest(const std::string& inWhatWasTried, int inResult,
         return Failure(code, inWhatWasTried + ": cancelled");
     }
     const std::string name = ZOCL::GetResultName(inResult);
-    Failure failure(code, inWhatWasTried + ": " + ReasonFor(code, inResult, inResponse) + " (" + name + ")",
-                    inHint.empty() ? HintFor(code) : std::move(inHint));
-    failure.mResultName = name;
-    failure.mStatus = inResponse && inResponse->status > 0 ? inResponse->status : 0;
-    return failure;
+    return Failure(code, inWhatWasTried + ": " + ReasonFor(code, inResult, inResponse) + " (" + name + ")",
+                   Details{inHint.empty() ? HintFor(code) : std::move(inHint), name,
+                           inResponse && inResponse->status > 0 ? inResponse->status : 0});
 }
 
 }  // namespace zo

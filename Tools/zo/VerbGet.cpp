@@ -161,7 +161,7 @@ public:
             return;
         }
         if (mFailures.size() == mTotal) {
-            throw mFailures.front();
+            throw Failure(mFailures.front());
         }
         for (const Failure& failure : mFailures) {
             mContext.Out().Error(failure);
