@@ -67,6 +67,10 @@ public:
                                           const InterfaceRef<IZOCProduction>& inProduction,
                                           const UString& inTransactionType) override;
     InterfaceRef<IZOCTransactionList> GetOrCreateTransactionList() override;
+    void WaitForPendingTransactions(const std::vector<ImmutableString>& inIgnoredTypes,
+                                    const ResultCompletion& inCompletion) override;
+    bool GetPendingTransactions(const std::vector<ImmutableString>& inIgnoredTypes,
+                                const ResultCompletion& inCompletion) override;
     InterfaceRef<IZOCProduction> GetParentProduction() override;
     ImmutableString GetParentProductionIdentifier() override;
     bool Push(const Guid& inRequestID, const RequestCompletion& inCompletion, const UString& inCommitMessage,

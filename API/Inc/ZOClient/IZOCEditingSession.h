@@ -59,6 +59,16 @@ public:
     /// The session's open transactions, not loaded by this call; the same object each time. Null without the
     /// link.
     virtual InterfaceRef<IZOCTransactionList> GetOrCreateTransactionList() = 0;
+    /// Waits until no other client has a transaction open on this session, and then completes with 0.
+    /// Transactions that this application left on this machine are rolled back first, whatever run they are
+    /// of. For the rest a window tells the user who is in the way; closing it, or a list that cannot be
+    /// loaded, gives a failure. A load that the user cancels completes with that cancel result.
+    /// Main thread: it blocks while the list loads under a progress window, and may complete on its stack.
+    virtual void WaitForPendingTransactions(const std::vector<ImmutableString>& inIgnoredTypes,
+                                            const ResultCompletion& inCompletion) = 0;
+    /// The same from any thread: the list is loaded without a window.
+    virtual bool GetPendingTransactions(const std::vector<ImmutableString>& inIgnoredTypes,
+                                        const ResultCompletion& inCompletion) = 0;
     /// The production that this session belongs to, not loaded by this call; null when it is not known.
     virtual InterfaceRef<IZOCProduction> GetParentProduction() = 0;
     virtual ImmutableString GetParentProductionIdentifier() = 0;
