@@ -6,8 +6,6 @@ BENCH := $(NAME)
 export CCACHE_BASEDIR := $(CURDIR)
 export CCACHE_NOHASHDIR := 1
 
-# A red test is run once more: one of eight processes that make the registry at the same moment can fail to open
-# it (seen once in about ten runs); the output shows both runs.
 .PHONY: demo test bench packages build release asan tsan analysis format format-check tidy clean
 
 packages:
@@ -21,7 +19,7 @@ demo: build
 	bash Tools/demo/demo.sh build/dev
 
 test: build
-	ctest --preset dev -j $(JOBS) --repeat until-pass:2
+	ctest --preset dev -j $(JOBS)
 
 release: packages
 	cmake --preset release >/dev/null
@@ -34,7 +32,7 @@ bench: release
 asan tsan: packages
 	cmake --preset $@ >/dev/null
 	cmake --build --preset $@ -j $(JOBS)
-	ctest --preset $@ -j $(JOBS) -LE build --repeat until-pass:2
+	ctest --preset $@ -j $(JOBS) -LE build
 
 # clang checks the lock annotations; nothing is run.
 analysis: packages
