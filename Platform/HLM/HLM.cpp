@@ -4,6 +4,7 @@
 #include <atomic>
 #include <cstdlib>
 
+#include "ostcore/threads/Mutex.h"
 #include "ostcore/utility/StringConversion.h"
 
 namespace HLM {
@@ -20,6 +21,16 @@ std::atomic<bool>& Headless() {
     return isHeadless;
 }
 
+struct Ending {
+    ostcore::threads::Mutex mutex;
+    ostcore::function<void()> function ZO_GUARDED_BY(mutex);
+};
+
+Ending& TheEnding() {
+    static Ending& ending = *new Ending;
+    return ending;
+}
+
 }  // namespace
 
 bool GetIsHeadless() {
@@ -27,6 +38,27 @@ bool GetIsHeadless() {
 }
 void SetIsHeadless(bool inIsHeadless) {
     Headless().store(inIsHeadless, std::memory_order_relaxed);
+}
+
+void SetEndProcessFunction(ostcore::function<void()> inFunction) {
+    Ending& ending = TheEnding();
+    ostcore::threads::MutexLock lock(ending.mutex);
+    ending.function.swap(inFunction);
+    lock.Unlock();
+}
+
+void EndProcess() {
+    ostcore::function<void()> end;
+    {
+        Ending& ending = TheEnding();
+        ostcore::threads::MutexLock lock(ending.mutex);
+        end = ending.function;
+    }
+    if (end) {
+        end();
+    } else {
+        std::exit(EXIT_FAILURE);
+    }
 }
 
 }  // namespace HLM

@@ -2,6 +2,7 @@
 #pragma once
 
 #include "ostcore/Export.h"
+#include "ostcore/Types.h"
 
 namespace HLM {
 
@@ -10,5 +11,11 @@ namespace HLM {
 ZOPLATFORM_EXPORT bool GetIsHeadless();
 /// Called by a host before it starts the library.
 ZOPLATFORM_EXPORT void SetIsHeadless(bool inIsHeadless);
+
+/// How this process ends when the library cannot go on without a user; a host that ends in a way of its own
+/// says so here. An empty function, as at the start, means std::exit with EXIT_FAILURE. Threads: any.
+ZOPLATFORM_EXPORT void SetEndProcessFunction(ostcore::function<void()> inFunction);
+/// Ends the process in that way. Main thread; hold no lock.
+ZOPLATFORM_EXPORT void EndProcess();
 
 }  // namespace HLM

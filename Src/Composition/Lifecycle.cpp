@@ -1,6 +1,7 @@
 // Start and end of the library: puts the floors together and takes them down in an order in which nothing is
 // used after it has gone.
 #include "Collaboration/CollaborationResources.h"
+#include "Connection/AutoAuthentication.h"
 #include "Frame/Station.h"
 #include "Frame/SyslogLogger.h"
 #include "Model/ModelResourceFactory.h"
@@ -37,6 +38,7 @@ void Shutdown() {
     if (gInitCount-- != 1) {
         return;
     }
+    StopAutoAuthentication();
     ResetSyslogLogger();
     // Before the network goes, which the polls use.
     PollingResourceMonitor::CancelAllOutstandingPolls(true);

@@ -2,7 +2,9 @@
 #include "Connection/ConnectSequence.h"
 #include "Connection/LoggedInServer.h"
 #include "Frame/Station.h"
+#include "HLM/HLM.h"
 #include "ostcore/debug/Trace.h"
+#include "ostcore/utility/StringConversion.h"
 #include "PollCancellation.h"
 #include "ResourceFactory.h"
 #include "ZOClient/Messages.h"
@@ -103,14 +105,17 @@ void IZOCDataServer::Terminate(bool inEndSession) {
         polls->CancelAllOutstandingPolls();
     }
     const InterfaceRef<DataServer> server = RFL::QueryInterface<DataServer>(ExchangeLoggedInServer(nullptr));
-    const ImmutableString token = server ? server->GetLoginData().token : ImmutableString();
+    const ZOLoginData login = server ? server->GetLoginData() : ZOLoginData();
     if (server) {
         server->EndUse();
     }
     if (!inEndSession) {
         return;
     }
-    Registry::ClearAuthToken(token);
+    Registry::ClearAuthToken(login.token);
+    if (HLM::GetIsHeadless() && !login.username.IsNull()) {
+        Registry::ClearAuthToken(login.token, ostcore::utility::ToUTF16(login.username.view()));
+    }
     if (server) {
         server->SendLogout();
     }

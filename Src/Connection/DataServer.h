@@ -11,6 +11,7 @@
 
 namespace ZOCL {
 
+class ReconnectDialog;
 class ResourceFactory;
 
 /// One server as the client sees it.
@@ -46,7 +47,6 @@ public:
 
     /// Runs the login sequence from wherever the tables stand. False: nothing was started.
     bool Authenticate(const ConnectCompletion& inCompletion, const Guid& inRequestID);
-    void GetNewAuthToken();
     bool TakeTokenFromResponse(const shared_ptr<ostnet::Response>& inResponse);
     bool VerifyAuthentication(const shared_ptr<ostnet::Response>& inResponse);
     /// Drops the token everywhere; what is parked ends with its 401.
@@ -56,6 +56,20 @@ public:
     /// Lets go of all objects; the server is of no more use for signing in again by itself.
     void EndUse();
     void ReleaseCaches();
+
+    // --- A token that was refused (DataServerRenewal.cpp).
+
+    /// Asked by the chain when the hub refuses the token: signs in again with the credentials that were kept,
+    /// or sees to it that the user is asked. Any thread.
+    void GetNewAuthToken();
+    /// Notes that the token is lost and has ShowWarningsIfNeeded run on the main thread, unless both has
+    /// happened. Any thread.
+    void ScheduleWarnings();
+    /// Tells the user what is wrong, if anything is. Main thread; may run windows.
+    void ShowWarningsIfNeeded();
+    /// Takes a token that the hub gave for this login elsewhere; what waits for one goes on. False when the
+    /// use of this server has ended. Any thread.
+    bool AdoptToken(const ImmutableString& inToken);
 
     struct FilledTables {
         bool root = false;
@@ -176,6 +190,14 @@ private:
     void UpdateLoginData() ZO_REQUIRES(IZOCDataServer::GetLock());
     bool BecomeLoggedInServer();
     void OnRenewed(int inResult, const InterfaceRef<IZOCDataServer>& inServer);
+    void PromptForReconnect();
+    /// False when the user gave up.
+    bool AskUntilReconnected(ReconnectDialog& ioDialog, const ZOLoginData& inLoginData);
+    /// Only a headless process: tells the host and ends the process.
+    void ReportFatalHeadlessError(const char* inMessage);
+    bool HasUseEnded() const;
+    /// Signs a token out that came too late to be used.
+    void Revoke(const ImmutableString& inToken);
     void OnProductionLoadedForCache(const ImmutableString& inURL,
                                     const InterfaceRef<IZOCProduction>& inProduction);
     InterfaceRef<IZOCProductionList> MakeProductionList(const ImmutableString& inRelation);
@@ -203,6 +225,11 @@ private:
     ZOSCredentials mSavedCredentials ZO_GUARDED_BY(IZOCDataServer::GetLock());
     bool mSupportsUploadCompression ZO_GUARDED_BY(IZOCDataServer::GetLock()) = false;
     bool mUseHasEnded ZO_GUARDED_BY(IZOCDataServer::GetLock()) = false;
+    /// The sign-in that renews the token, the null identifier when there is none.
+    Guid mRenewal ZO_GUARDED_BY(IZOCDataServer::GetLock());
+    shared_ptr<ReconnectDialog> mReconnectDialog ZO_GUARDED_BY(IZOCDataServer::GetLock());
+    std::atomic<bool> mTokenLost{false};
+    std::atomic<bool> mReconnectActive{false};
     std::unordered_map<ImmutableString, InterfaceRef<IZOCProduction>> mProductionCache
         ZO_GUARDED_BY(IZOCDataServer::GetLock());
     std::unordered_map<ImmutableString, InterfaceRef<IZOCMediaLocator>> mMediaLocatorCache

@@ -1,43 +1,18 @@
-// The login of a data server: taking, verifying, renewing and giving up its token.
+// The login of a data server: taking, verifying and giving up its token.
 #include "Connection/ConnectSequence.h"
 #include "Connection/DataServer.h"
 #include "Connection/LoggedInServer.h"
 #include "Connection/LoginToken.h"
+#include "Connection/ReconnectDialog.h"
+#include "Connection/RememberedLogin.h"
 #include "Frame/Station.h"
-#include "HLM/HLM.h"
-#include "ostcore/debug/Trace.h"
-#include "ostcore/utility/StringConversion.h"
+#include "ostnet/HeaderConstants.h"
 #include "Relations.h"
 #include "ZOClient/Messages.h"
-#include "ZOClient/Registry.h"
 
 namespace ZOCL {
 
 using ostcore::threads::ScopedLock;
-
-namespace {
-
-/// Overwrites the bytes before it lets them go.
-void WipePassword(std::string& ioPassword) {
-    volatile char* bytes = ioPassword.data();
-    for (std::size_t i = 0; i < ioPassword.size(); ++i) {
-        bytes[i] = 0;
-    }
-    ioPassword.clear();
-}
-
-/// What an accepted login leaves in the registry.
-void RememberLogin(const ZOLoginData& inData) {
-    if (HLM::GetIsHeadless()) {
-        Registry::StoreLoginData(inData, ostcore::utility::ToUTF16(inData.username.view()));
-    }
-    Registry::SetZORegistryValue(Registry::kRegistryHasLoggedInValue, u"true");
-    if (!Registry::IsZOEnabled()) {
-        Registry::ResetIsZOEnabled();
-    }
-}
-
-}  // namespace
 
 bool DataServer::Authenticate(const ConnectCompletion& inCompletion, const Guid& inRequestID) {
     return boost::make_shared<ConnectSequence>(InterfaceRef<DataServer>(this), inRequestID,
@@ -47,10 +22,17 @@ bool DataServer::Authenticate(const ConnectCompletion& inCompletion, const Guid&
 
 bool DataServer::TakeTokenFromResponse(const shared_ptr<ostnet::Response>& inResponse) {
     if (!inResponse || inResponse->status < 200 || inResponse->status > 399) {
-        mChain.authorization->SetAuthToken(ImmutableString());
+        // While the user is asked for the password, what is parked waits for the answer.
+        if (!mTokenLost) {
+            mChain.authorization->SetAuthToken(ImmutableString());
+        }
         return false;
     }
     const ImmutableString token = FindLoginToken(inResponse);
+    if (!token.IsNull() && HasUseEnded()) {
+        Revoke(token);
+        return false;
+    }
     ImmutableString held;
     {
         ScopedLock lock(IZOCDataServer::GetLock(), "DataServer::TakeTokenFromResponse");
@@ -108,47 +90,6 @@ void DataServer::DropToken() {
     mChain.authorization->SetAuthToken(ImmutableString());
 }
 
-void DataServer::GetNewAuthToken() {
-    bool canSignIn = false;
-    {
-        ScopedLock lock(IZOCDataServer::GetLock(), "DataServer::GetNewAuthToken");
-        canSignIn = !mUseHasEnded && !mSavedCredentials.username.IsNull() &&
-                    (!mSavedCredentials.token.IsNull() || !mSavedCredentials.password.empty());
-        if (canSignIn) {
-            mCredentials = mSavedCredentials;
-        } else {
-            mCredentials.token = ImmutableString();
-            WipePassword(mCredentials.password);
-        }
-    }
-    const InterfaceRef<DataServer> self(this);
-    const auto onRenewed = [self](const Guid&, const InterfaceRef<IZOCDataServer>& inServer, int inResult,
-                                  const shared_ptr<ostnet::Response>&) {
-        self->OnRenewed(inResult, inServer);
-    };
-    if (!canSignIn || !Authenticate(onRenewed, Guid::CreateUnique())) {
-        mChain.authorization->SetAuthToken(ImmutableString());
-    }
-}
-
-void DataServer::OnRenewed(int inResult, const InterfaceRef<IZOCDataServer>& inServer) {
-    if (inResult >= 0 && inServer) {
-        return;
-    }
-    if (ostcore::debug::TraceEnabled("ZOCL", ostcore::debug::kTraceLevel_Error)) {
-        ostcore::debug::Trace(
-            "ZOCL", ostcore::debug::kTraceLevel_Error,
-            ostcore::debug::StructuredText("The authentication token has expired and the attempt "
-                                           "to re-authenticate failed.")
-                .Add("server", mBaseURL.view())
-                .Add("result", GetResultName(inResult)));
-    }
-    // Whatever way the sequence ended, nobody waits for a token that does not come.
-    if (GetToken().IsNull()) {
-        mChain.authorization->SetAuthToken(ImmutableString());
-    }
-}
-
 void DataServer::SendLogout() {
     const ImmutableString url = GetLink(kRelation_System_Logout);
     if (url.IsNull()) {
@@ -158,6 +99,19 @@ void DataServer::SendLogout() {
     mChain.authorization->SetAuthToken(GetToken());
     BlockingPOST(url, ostnet::Headers(), shared_ptr<RecycledMemory const>(), ostnet::http::kWaitForever);
     DropToken();
+}
+
+void DataServer::Revoke(const ImmutableString& inToken) {
+    const ImmutableString link = GetLink(kRelation_System_Logout);
+    const ImmutableString url = link.IsNull() ? link : MakeRequestURL(link);
+    if (url.IsNull()) {
+        return;
+    }
+    // Past the chain, which has another token or none.
+    mChain.global->POST(
+        Guid::CreateUnique(), [](const Guid&, const shared_ptr<ostnet::Response>&) {}, url,
+        {{ostnet::kHEADER_COOKIE, inToken}}, shared_ptr<RecycledMemory const>(),
+        ostnet::http::RequestOptions());
 }
 
 void DataServer::ReleaseCaches() {
@@ -174,10 +128,24 @@ void DataServer::ReleaseCaches() {
 void DataServer::EndUse() {
     ReleaseCaches();
     mChain.recoverableError->SetRetriesEnabled(false);
-    ScopedLock lock(IZOCDataServer::GetLock(), "ZOCL::DataServer::Terminate");
-    mLoginData = ZOLoginData();
-    mUseHasEnded = true;
-    WipePassword(mSavedCredentials.password);
+    Guid renewal;
+    shared_ptr<ReconnectDialog> dialog;
+    {
+        ScopedLock lock(IZOCDataServer::GetLock(), "ZOCL::DataServer::Terminate");
+        mLoginData = ZOLoginData();
+        mUseHasEnded = true;
+        WipePassword(mSavedCredentials.password);
+        renewal = mRenewal;
+        dialog = mReconnectDialog;
+    }
+    // A sign-in that is under way ends, and takes what is parked with it; what waits for the user ends here.
+    CancelConnectRequest(renewal);
+    if (dialog) {
+        dialog->CloseAsOvertaken();
+    }
+    if (mTokenLost) {
+        mChain.authorization->SetAuthToken(GetToken());
+    }
 }
 
 }  // namespace ZOCL

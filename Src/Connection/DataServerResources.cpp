@@ -133,7 +133,8 @@ InterfaceRef<IZOCProduction> DataServer::CreateProduction(const UString& inName,
     if (!CreateProduction(requestID, inName, inDescription, inIsTemporary, onCreated)) {
         return nullptr;
     }
-    WaitForRequest(outcome->gate, requestID, ostnet::http::kWaitForever, *mChain.upload);
+    WaitForRequest(outcome->gate, requestID, ostnet::http::kWaitForever, *mChain.upload,
+                   [this] { ShowWarningsIfNeeded(); });
     return outcome->production;
 }
 

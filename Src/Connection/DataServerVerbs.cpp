@@ -79,7 +79,8 @@ DataServer::ResponseRef DataServer::WaitForResponse(
     if (!started) {
         return nullptr;
     }
-    WaitForRequest(data->Gate(), requestID, inTimeoutMilliseconds, *mChain.upload);
+    WaitForRequest(data->Gate(), requestID, inTimeoutMilliseconds, *mChain.upload,
+                   [this] { ShowWarningsIfNeeded(); });
     return data->Response();
 }
 

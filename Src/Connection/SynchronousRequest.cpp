@@ -34,10 +34,11 @@ int CountOfBlockedWaits() noexcept {
 }
 
 void WaitForRequest(Gate& ioGate, const Guid& inRequestID, std::uint32_t inTimeoutMilliseconds,
-                    ostnet::http::RequestProcessor& ioTop) {
+                    ostnet::http::RequestProcessor& ioTop, const function<void()>& inWhileMainThreadWaits) {
     const BlockedWaitCount count(ioTop.WaitingForRequest(inRequestID, inTimeoutMilliseconds));
     if (ostcore::threads::IsMainThread()) {
         while (!Gate::PassThrough(ioGate, kMainThreadWaitMilliseconds)) {
+            inWhileMainThreadWaits();
         }
         return;
     }

@@ -25,10 +25,12 @@ private:
     shared_ptr<ostnet::Response> mResponse;
 };
 
-/// Waits until the gate opens. On the main thread for as long as it takes; elsewhere the time-out, when it
-/// passes, cancels the request, and the wait goes on for the end that this brings.
+/// Waits until the gate opens. On the main thread for as long as it takes, with a call of the function every
+/// 1500 milliseconds, so that the user learns what the wait is for; elsewhere the time-out, when it passes,
+/// cancels the request, and the wait goes on for the end that this brings.
 void WaitForRequest(ostcore::threads::Gate& ioGate, const Guid& inRequestID,
-                    std::uint32_t inTimeoutMilliseconds, ostnet::http::RequestProcessor& ioTop);
+                    std::uint32_t inTimeoutMilliseconds, ostnet::http::RequestProcessor& ioTop,
+                    const function<void()>& inWhileMainThreadWaits);
 
 /// How many threads now wait for a request that the base processor serves meanwhile.
 int CountOfBlockedWaits() noexcept;

@@ -25,6 +25,8 @@ const UString kLastServer = u"LastServer";
 const UString kLastServerSecure = u"LastServerSecureConnection";
 const UString kLastUsername = u"LastUsername";
 const UString kLastToken = u"LastAuthenticationToken";
+/// The server that gave the token. Written with it in one transaction, since the list of servers is not.
+const UString kLastTokenServer = u"LastAuthenticationServer";
 const UString kRecentServers = u"RecentServers";
 const UString kRecentServer = u"RecentServer";
 const UString kServer = u"Server";
@@ -152,6 +154,42 @@ bool TakeOverLastServer(std::vector<RecentServer>& ioServers) {
     return true;
 }
 
+UString TokenServerText(const ZOLoginData& inData) {
+    return (inData.secure ? u"https://" : u"http://") + ToUTF16(inData.serverURL.view());
+}
+
+/// User name and token as they were stored together; another process may store between two reads.
+struct StoredLogin {
+    bool hasUsername = false;
+    UString username;
+    UString token;
+    UString tokenServer;
+
+    friend bool operator==(const StoredLogin&, const StoredLogin&) = default;
+};
+
+StoredLogin ReadStoredLoginOnce(const RegistryKey& inKey) {
+    StoredLogin login;
+    login.hasUsername = Succeeded(inKey.GetStringValue(kLastUsername, login.username));
+    inKey.GetStringValue(kLastToken, login.token);
+    inKey.GetStringValue(kLastTokenServer, login.tokenServer);
+    return login;
+}
+
+StoredLogin ReadStoredLogin(const RegistryKey& inKey) {
+    constexpr int kAttempts = 20;
+    StoredLogin login = ReadStoredLoginOnce(inKey);
+    for (int attempt = 0; attempt < kAttempts; ++attempt) {
+        StoredLogin again = ReadStoredLoginOnce(inKey);
+        if (again == login) {
+            return login;
+        }
+        login = std::move(again);
+    }
+    login.token.clear();
+    return login;
+}
+
 UString PathOfSubKey(const UString& inSubKey) {
     return GetZORegistryBaseKey() + inSubKey;
 }
@@ -222,14 +260,14 @@ bool GetLastLoginData(ZOLoginData& outData, bool inSyncFirst, const UString& inS
     if (!GetNewestServer(key, inSubKey, outData) || isNew) {
         return false;
     }
-    UString username;
-    if (!Succeeded(key.GetStringValue(kLastUsername, username))) {
+    const StoredLogin login = ReadStoredLogin(key);
+    if (!login.hasUsername) {
         return false;
     }
-    outData.username = ImmutableString(ToUTF8(username));
-    UString token;
-    key.GetStringValue(kLastToken, token);
-    outData.token = ImmutableString(ToUTF8(token));
+    outData.username = ImmutableString(ToUTF8(login.username));
+    // A token without a server is from an earlier version, which kept one server.
+    const bool isOfThisServer = login.tokenServer.empty() || login.tokenServer == TokenServerText(outData);
+    outData.token = isOfThisServer ? ImmutableString(ToUTF8(login.token)) : ImmutableString();
     return true;
 }
 
@@ -246,7 +284,8 @@ bool StoreLoginData(const ZOLoginData& inData, const UString& inSubKey) {
         return false;
     }
     if (!Succeeded(key.Apply({RFL::RegistryChange::SetString(kLastUsername, ToUTF16(inData.username.view())),
-                              RFL::RegistryChange::SetString(kLastToken, ToUTF16(inData.token.view()))}))) {
+                              RFL::RegistryChange::SetString(kLastToken, ToUTF16(inData.token.view())),
+                              RFL::RegistryChange::SetString(kLastTokenServer, TokenServerText(inData))}))) {
         return false;
     }
     // The former token must not stay behind in the files.
@@ -281,9 +320,9 @@ ImmutableString GetLatestExpectedAuthToken() {
     return memory.latestExpectedAuthToken;
 }
 
-void ClearAuthToken(const ImmutableString& inToken) {
+void ClearAuthToken(const ImmutableString& inToken, const UString& inSubKey) {
     RegistryKey key;
-    if (!inToken.IsNull() && Succeeded(RegistryKey::Open(RegistryRoot::User, GetZORegistryBaseKey(),
+    if (!inToken.IsNull() && Succeeded(RegistryKey::Open(RegistryRoot::User, PathOfSubKey(inSubKey),
                                                          RegistryAccess::ReadWrite, key))) {
         key.DeleteStringValueIf(kLastToken, ToUTF16(inToken.view()));
     }

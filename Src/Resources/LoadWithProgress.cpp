@@ -1,11 +1,9 @@
 // A load under a progress window.
-#include <atomic>
-
+#include "Frame/BatchOperationBase.h"
 #include "Frame/ProgressWindow.h"
 #include "ostcore/config/ZString.h"
 #include "ZOClient/IZOCServerResource.h"
 #include "ZOClient/Progress.h"
-#include "ZOClient/ResultCodes.h"
 
 namespace ZOCL {
 
@@ -18,32 +16,10 @@ const char kWaitingText[] =
     "Collaboration Hub.";
 
 /// One load or refresh. Its completion holds it, so that it outlives the window.
-class LoadOperation final : public RFL::IBatchOperation {
+class LoadOperation final : public BatchOperationBase {
 public:
     explicit LoadOperation(const InterfaceRef<IZOCServerResource>& inResource) : mResource(inResource) {}
 
-    std::uint32_t AddRef() noexcept override { return mReferences.Add(); }
-    std::uint32_t Release() noexcept override {
-        const std::uint32_t left = mReferences.Drop();
-        if (left == 0) {
-            delete this;
-        }
-        return left;
-    }
-    int QueryInterface(const RFL::InterfaceID& inID, void** outInterface) noexcept override {
-        const int result = QueryInterfaceNoAddRef(inID, outInterface);
-        if (result >= 0) {
-            AddRef();
-        }
-        return result;
-    }
-    int QueryInterfaceNoAddRef(const RFL::InterfaceID& inID, void** outInterface) noexcept override {
-        const bool isKnown = inID == RFL::IBatchOperation::kInterfaceID || inID == kInterfaceID;
-        *outInterface = isKnown ? static_cast<RFL::IBatchOperation*>(this) : nullptr;
-        return isKnown ? RFL::kResultSuccess : RFL::kResultInterfaceNotSupported;
-    }
-
-    ImmutableString GetStationID() override { return mStation; }
     UString GetDescription() override { return u"LoadServerResourceWithProgress"; }
     bool Start() override {
         const RequestCompletion completion =
@@ -55,20 +31,14 @@ public:
     }
     void Abort() override { mResource->TryToCancelRequest(mRequestID); }
 
-    int GetResult() const noexcept { return mResult; }
-
 private:
     void OnLoaded(int inResult, const shared_ptr<ostnet::Response>& inResponse) {
         const bool isUnchanged = inResult < 0 && inResponse && inResponse->status == kStatusNotModified;
-        mResult = isUnchanged ? kResultSuccess : inResult;
-        RFL::StationUtils::PostMessageToUIThread(mStation, RFL::OperationCompleteMessage(), false);
+        Finish(isUnchanged ? kResultSuccess : inResult);
     }
 
     const InterfaceRef<IZOCServerResource> mResource;
     const Guid mRequestID = Guid::CreateUnique();
-    const ImmutableString mStation = RFL::StationRegistry::RegisterUniqueStation();
-    std::atomic<int> mResult{kResultFailure};
-    RFL::RefCount mReferences;
 };
 
 }  // namespace

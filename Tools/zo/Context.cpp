@@ -6,6 +6,7 @@
 #include "Failure.h"
 #include "HLM/HLM.h"
 #include "ostcore/config/ClientInfo.h"
+#include "ostui/TerminalBackEnd.h"
 #include "RFL/Registry.h"
 #include "ServerAddress.h"
 #include "StoredToken.h"
@@ -32,13 +33,19 @@ std::string FirstOf(std::initializer_list<std::optional<std::string>> inPlaces) 
 
 Library::Library(MainLoop& inLoop) : mLoop(inLoop) {
     HLM::SetIsHeadless(true);
+    // A login that is lost ends the verb's own requests, and with them the verb, by its exit code.
+    HLM::SetEndProcessFunction([] {});
     ostcore::config::SetClientName("zo");
     ostcore::config::SetClientBuildNumber(ZO_VERSION);
     ZOCL::Initialize();
+    ostui::TerminalSettings terminal;
+    terminal.isInterrupted = [this] { return mLoop.IsInterrupted(); };
+    ostui::SetBackEnd(ostui::CreateTerminalBackEnd(terminal));
 }
 
 Library::~Library() {
     mLoop.Drain();
+    ostui::SetBackEnd(nullptr);
     ZOCL::IZOCDataServer::Terminate(false);
     ZOCL::Shutdown();
     // The last one to close brings the registry's journal into its file, so that what was deleted is gone.

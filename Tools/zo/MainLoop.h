@@ -53,6 +53,7 @@ public:
 
     std::size_t InFlight() const noexcept { return mInFlight.size(); }
     void ThrowIfInterrupted() const;
+    bool IsInterrupted() const noexcept { return mInterrupt.IsRequested(); }
     /// Cancels what is in flight and waits for its end. For the way out after a failure.
     void Drain();
 

@@ -13,6 +13,15 @@ struct ZOCL_EXPORT ZOLoginMessage : RFL::MessageImpl<ZOLoginMessage> {};
 /// IZOCDataServer::Terminate has ended the session.
 struct ZOCL_EXPORT ZOLogoutMessage : RFL::MessageImpl<ZOLogoutMessage> {};
 
+/// An automatic sign-in was accepted (HandleAutoAuthentication).
+struct ZOCL_EXPORT ZOInitializeConnectionMessage : RFL::MessageImpl<ZOInitializeConnectionMessage> {};
+
+/// The connection ends without the host asking for it: the user gave up on a login that had expired, or
+/// signed out from a window of the library. Delivered before the operation that posts it goes on.
+struct ZOCL_EXPORT ZOTerminateConnectionMessage : RFL::MessageImpl<ZOTerminateConnectionMessage> {
+    bool forced = false;
+};
+
 /// A connect request has ended; posted before its completion is called.
 struct ZOCL_EXPORT IZOCDataServer::LoginCompleteMessage
     : RFL::MessageImpl<IZOCDataServer::LoginCompleteMessage> {

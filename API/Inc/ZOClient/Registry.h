@@ -27,7 +27,8 @@ ZOCL_EXPORT bool SetZORegistryValue(const UString& inName, const UString& inValu
 
 /// The last login of a user name (headless processes keep one for each), or for an empty one that of this
 /// account. inSyncFirst sees to it that what other processes wrote is seen.
-/// A missing token is no failure; a missing server or user name is.
+/// A missing token is no failure; a missing server or user name is. A token that another server gave is not
+/// told: it goes to nobody but the server that it came from.
 ZOCL_EXPORT bool GetLastLoginData(ZOLoginData& outData, bool inSyncFirst, const UString& inSubKey);
 ZOCL_EXPORT bool StoreLoginData(const ZOLoginData& inData, const UString& inSubKey);
 
@@ -44,8 +45,9 @@ ZOCL_EXPORT bool StoreRecentServers(const std::vector<RecentServer>& inServers);
 
 /// The token that this process stored last; null when it stored none.
 ZOCL_EXPORT ImmutableString GetLatestExpectedAuthToken();
-/// Forgets the stored token if it is still this one; what another process has stored since stays.
-ZOCL_EXPORT void ClearAuthToken(const ImmutableString& inToken);
+/// Forgets the stored token if it is still this one; what another process has stored since stays. The sub
+/// key is that of GetLastLoginData.
+ZOCL_EXPORT void ClearAuthToken(const ImmutableString& inToken, const UString& inSubKey = UString());
 
 /// Whether a login was ever accepted for this user or, for want of a base key, on this machine. The answer
 /// is kept until ResetIsZOEnabled.

@@ -103,6 +103,13 @@ bool WriteAside(const std::string& inPath, std::string_view inBytes, unsigned in
            ::fsync(file.Get()) == 0 && file.Close();
 }
 
+// Whether nobody has written to the file since, as far as the file system tells.
+bool IsUnchangedSince(int inFile, const struct stat& inBefore) {
+    struct stat now {};
+    return ::fstat(inFile, &now) == 0 && now.st_size == inBefore.st_size &&
+           now.st_mtim.tv_sec == inBefore.st_mtim.tv_sec && now.st_mtim.tv_nsec == inBefore.st_mtim.tv_nsec;
+}
+
 }  // namespace
 
 shared_ptr<RecycledMemory> File::Read(const std::string& inPath, std::size_t inMaximumSize,
@@ -122,7 +129,11 @@ shared_ptr<RecycledMemory> File::Read(const std::string& inPath, std::size_t inM
     if (static_cast<std::size_t>(status.st_size) <= inMaximumSize) {
         memory->Reserve(static_cast<std::size_t>(status.st_size) + 1);
         if (ReadAll(file.Get(), inMaximumSize, *memory)) {
-            return memory;
+            if (IsUnchangedSince(file.Get(), status)) {
+                return memory;
+            }
+            Tell(outError, "read", inPath, "it was changed meanwhile");
+            return {};
         }
     } else {
         errno = EFBIG;

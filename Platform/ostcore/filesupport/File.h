@@ -16,7 +16,8 @@ constexpr std::size_t kDefaultMaximumFileSize = std::size_t(1) << 30;
 /// Operations on whole files. Errors tell what was tried, on which file, and why it failed. Threads: any.
 class ZOPLATFORM_EXPORT File {
 public:
-    /// The content of a regular file; null when it cannot be read or is larger than the bound.
+    /// The content of a regular file; null when it cannot be read, is larger than the bound, or was written
+    /// to while it was read, as far as the file system's times tell.
     static shared_ptr<utility::RecycledMemory> Read(const std::string& inPath,
                                                     std::size_t inMaximumSize = kDefaultMaximumFileSize,
                                                     std::string* outError = nullptr);
