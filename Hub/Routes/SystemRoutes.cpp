@@ -4,6 +4,7 @@
 #include "Base/Password.h"
 #include "Base/Text.h"
 #include "Http/Multipart.h"
+#include "Routes/DifferenceLinks.h"
 #include "Routes/Documents.h"
 #include "Routes/RouteTable.h"
 
@@ -56,6 +57,7 @@ Response ServiceLinks(Call& ioCall) {
             links.Named("/productions", api + "/p");
             links.Named("/productions/templates", api + "/templates");
             links.Named("/productions/production#byIdAndCommitId", api + "/p/{productionId}/at/{commitId}");
+            links.Named("/productions/production#differenceByCommit", api + kDifferenceByCommitTemplate);
             links.Named("/medialocators", api + "/l");
             links.Named("/medialocator#byMediaLocatorId", api + "/l/{mediaLocatorId}");
         }
