@@ -72,10 +72,14 @@ public:
     }
 
     std::map<ChangedItem, Change> Walk(CommitRecord inFrom, std::string const& inEnd) {
+        TreeRoot after = mRepository.LoadTree(inFrom.tree);
         for (int steps = 0; steps < kMaxWalk && mWanted != 0 && inFrom.id != inEnd; ++steps) {
             auto parent = inFrom.parent.empty() ? std::nullopt : mTransaction.FindCommit(inFrom.parent);
-            if (!parent || parent->tree != inFrom.tree)
-                Attribute(inFrom, parent ? mRepository.LoadTree(parent->tree) : TreeRoot());
+            if (!parent || parent->tree != inFrom.tree) {
+                TreeRoot before = parent ? mRepository.LoadTree(parent->tree) : TreeRoot();
+                Attribute(inFrom, before, after);
+                after = std::move(before);
+            }
             if (!parent)
                 break;
             inFrom = std::move(*parent);
@@ -89,16 +93,15 @@ private:
         ++mWanted;
     }
 
-    void Attribute(CommitRecord const& inCommit, TreeRoot const& inBefore) {
+    void Attribute(CommitRecord const& inCommit, TreeRoot const& inBefore, TreeRoot const& inAfter) {
         mCommit = &inCommit;
-        TreeRoot const after = mRepository.LoadTree(inCommit.tree);
-        if (!SameProperties(inBefore.properties, after.properties))
+        if (!SameProperties(inBefore.properties, inAfter.properties))
             Found({ChangedItem::Kind::Properties, "", ""});
-        CompareEnclosures(inBefore.enclosures, after.enclosures, [&](ChangeType, EnclosureState const& e) {
+        CompareEnclosures(inBefore.enclosures, inAfter.enclosures, [&](ChangeType, EnclosureState const& e) {
             Found({ChangedItem::Kind::Enclosure, "", e.name});
         });
         auto const compared =
-            AssetMap(mTransaction, inBefore.assets).CompareTo(AssetMap(mTransaction, after.assets));
+            AssetMap(mTransaction, inBefore.assets).CompareTo(AssetMap(mTransaction, inAfter.assets));
         for (auto const& difference : compared.differences)
             if (mWantedByAsset.count(difference.id))
                 AttributeAsset(difference);
