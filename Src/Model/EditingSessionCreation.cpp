@@ -1,4 +1,6 @@
 // Finds the session in which a user works on a production, or makes one.
+#include <set>
+
 #include "Model/DataServerCaches.h"
 #include "Model/Production.h"
 #include "Model/ProductionList.h"
@@ -13,8 +15,6 @@ namespace {
 
 /// What stands in a trace for the status of a response that never came.
 constexpr std::int64_t kStatusOfNullResponse = -2;
-/// More pages of sessions than any production has; a list that goes on beyond them leads in a circle.
-constexpr int kMaximumPages = 1000;
 
 void TraceFailure(const ostcore::debug::StructuredText& inText) {
     ostcore::debug::Trace(std::string_view("ZOCL.Production"), ostcore::debug::kTraceLevel_Error, inText);
@@ -34,11 +34,17 @@ ImmutableString FindUserID(const InterfaceRef<IZOCDataServer>& inServer) {
     return resource && resource->Load(true) ? user->GetUserID() : ImmutableString();
 }
 
+ImmutableString URLOf(const InterfaceRef<IZOCProductionList>& inList) {
+    return RFL::QueryInterface<IZOCServerResource>(inList)->GetHTTPURL();
+}
+
 /// The URL of the user's session in a list; null when there is none or the list cannot be read.
 ImmutableString FindSessionOfUser(InterfaceRef<IZOCProductionList> ioList,
                                   const InterfaceRef<IZOCDataServer>& inServer) {
     ImmutableString userID;
-    for (int page = 0; ioList && page < kMaximumPages && ioList->Load(true); ++page) {
+    // A list that leads back to a page that was seen ends there.
+    std::set<ImmutableString> seen;
+    while (seen.insert(URLOf(ioList)).second && ioList->Load(true)) {
         const auto entries = ioList->GetAllItems();
         if (!entries.empty() && userID.empty()) {
             userID = FindUserID(inServer);
@@ -49,6 +55,9 @@ ImmutableString FindSessionOfUser(InterfaceRef<IZOCProductionList> ioList,
             }
         }
         ioList = ioList->GetNextPage();
+        if (!ioList) {
+            break;
+        }
     }
     return ImmutableString();
 }

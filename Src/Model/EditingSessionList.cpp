@@ -1,4 +1,6 @@
 // Gets all sessions of a production, each loaded.
+#include <set>
+
 #include "ostcore/debug/Trace.h"
 #include "Resources/JoinText.h"
 #include "Resources/ServerResource.h"
@@ -20,16 +22,6 @@ InterfaceRef<IZOCServerResource> AsResource(const InterfaceRef<IZOCProduction>& 
     return RFL::QueryInterface<IZOCServerResource>(inProduction);
 }
 
-Sessions KeepLoaded(const Sessions& inSessions) {
-    Sessions loaded;
-    for (const auto& session : inSessions) {
-        if (AsResource(session)->IsLoaded()) {
-            loaded.push_back(session);
-        }
-    }
-    return loaded;
-}
-
 /// One that was discarded since the list was made is no failure; it is left out.
 int OnSessionLoaded(const InterfaceRef<IZOCServerResource>& inSession, int inResult) {
     const int result = inResult >= 0 && !inSession->IsLoaded() ? kResultFailure : inResult;
@@ -41,22 +33,68 @@ int OnSessionLoaded(const InterfaceRef<IZOCServerResource>& inSession, int inRes
     return result == kResultHTTPNotFound ? kResultSuccess : result;
 }
 
-void StartSessions(const shared_ptr<CompoundAsyncOperation>& inOperation,
-                   const InterfaceRef<IZOCProductionList>& inList, Sessions& outSessions) {
-    for (const auto& entry : inList->GetAllItems()) {
-        if (const auto session = inList->GetProduction(entry)) {
-            outSessions.push_back(session);
+/// One walk over the pages of a list: each page starts the loads of its sessions and that of the next page.
+class SessionWalk : public enable_shared_from_this<SessionWalk> {
+public:
+    /// The loads are requests of the operation.
+    void LoadPage(const shared_ptr<CompoundAsyncOperation>& inOperation,
+                  const InterfaceRef<IZOCProductionList>& inPage) {
+        const auto resource = RFL::QueryInterface<IZOCServerResource>(inPage);
+        // A list that leads back to a page that was seen ends there.
+        if (!resource || !mSeenPages.insert(resource->GetHTTPURL()).second) {
+            return;
         }
-    }
-    for (const auto& session : outSessions) {
-        const auto resource = AsResource(session);
+        ostcore::debug::Trace(Channel(), ostcore::debug::kTraceLevel_Progress,
+                              JoinText("Load editing session list with URL ", resource->GetHTTPURL()));
+        const auto self = shared_from_this();
         inOperation->Initiate(
             [resource](const Guid& inID, const RequestCompletion& inDone) {
                 return resource->Load(inID, inDone, true);
             },
-            [resource](int inResult) { return OnSessionLoaded(resource, inResult); });
+            [self, inOperation, inPage, resource](int inResult) {
+                const int result = inResult >= 0 && !resource->IsLoaded() ? kResultFailure : inResult;
+                ostcore::debug::Trace(Channel(), ostcore::debug::kTraceLevel_Progress,
+                                      JoinText("Editing session list loaded, inResult == ", result));
+                if (result >= 0) {
+                    self->StartSessions(inOperation, inPage);
+                    self->LoadPage(inOperation, inPage->GetNextPage());
+                }
+                return result;
+            });
     }
-}
+    /// When the operation has ended.
+    Sessions GetLoaded() const {
+        Sessions loaded;
+        for (const auto& session : mSessions) {
+            if (AsResource(session)->IsLoaded()) {
+                loaded.push_back(session);
+            }
+        }
+        return loaded;
+    }
+
+private:
+    void StartSessions(const shared_ptr<CompoundAsyncOperation>& inOperation,
+                       const InterfaceRef<IZOCProductionList>& inPage) {
+        for (const auto& entry : inPage->GetAllItems()) {
+            const auto session = inPage->GetProduction(entry);
+            const auto resource = AsResource(session);
+            if (!resource) {
+                continue;
+            }
+            mSessions.push_back(session);
+            inOperation->Initiate(
+                [resource](const Guid& inID, const RequestCompletion& inDone) {
+                    return resource->Load(inID, inDone, true);
+                },
+                [resource](int inResult) { return OnSessionLoaded(resource, inResult); });
+        }
+    }
+
+    // One page is read at a time, and nobody asks for the result before the last has been.
+    std::set<ImmutableString> mSeenPages;
+    Sessions mSessions;
+};
 
 }  // namespace
 
@@ -70,29 +108,15 @@ bool GetEditingSessionList(const InterfaceRef<IZOCProduction>& inProduction,
             "The production offers no editing sessions; load it before they are asked for.");
         return false;
     }
-    const auto sessions = boost::make_shared<Sessions>();
+    const auto walk = boost::make_shared<SessionWalk>();
     const auto operation = CompoundAsyncOperation::Create(
-        [sessions, inCompletion](int inResult) {
+        [walk, inCompletion](int inResult) {
             if (inCompletion) {
-                inCompletion(inResult, KeepLoaded(*sessions));
+                inCompletion(inResult, walk->GetLoaded());
             }
         },
         resource->GetServer(), false);
-    ostcore::debug::Trace(Channel(), ostcore::debug::kTraceLevel_Progress,
-                          JoinText("Load editing session list with URL ", resource->GetHTTPURL()));
-    operation->Initiate(
-        [resource](const Guid& inID, const RequestCompletion& inDone) {
-            return resource->Load(inID, inDone, true);
-        },
-        [operation, list, resource, sessions](int inResult) {
-            const int result = inResult >= 0 && !resource->IsLoaded() ? kResultFailure : inResult;
-            if (result >= 0) {
-                StartSessions(operation, list, *sessions);
-            }
-            ostcore::debug::Trace(Channel(), ostcore::debug::kTraceLevel_Progress,
-                                  JoinText("Editing session list loaded, inResult == ", inResult));
-            return result;
-        });
+    walk->LoadPage(operation, list);
     return true;
 }
 

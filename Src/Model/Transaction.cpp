@@ -138,6 +138,10 @@ void Production::OnCommitted(const Guid& inRequestID, int inResult,
     const auto complete = [inRequestID, inResult, inResponse, inCompletion, session](
                               const Guid&, int, const InterfaceRef<IZOCServerResource>&,
                               const shared_ptr<ostnet::Response>&) {
+        // A refresh that failed leaves nothing behind; the answer to the commit tells the same.
+        if (inResult >= 0 && session && !session->IsLoaded()) {
+            session->InitFromResponse(inResponse, ResourceWritability::kKeep);
+        }
         if (inCompletion) {
             inCompletion(inRequestID, inResult, session, inResponse);
         }

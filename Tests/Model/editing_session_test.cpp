@@ -204,6 +204,14 @@ TEST_F(EditingSessionTest, AllSessionsAreLoadedAndThoseThatWentMeanwhileLeftOut)
     On("GET /gone", ScriptedAnswer::Status(500));
     EXPECT_EQ(load(sessions), kResultHTTPInternalServerError);
     EXPECT_EQ(sessions.size(), 1u);
+    On("GET /p1/sessions", JSONAnswer("{'sessions':[" + ItemOf("a", "/s1") +
+                                      "],'links':[{'rel':'next','href':'" + HubURL("/page2").str() + "'}]}"));
+    On("GET /page2", JSONAnswer("{'sessions':[" + ItemOf("b", "/s2") + "],'links':[{'rel':'next','href':'" +
+                                HubURL("/p1/sessions").str() + "'}]}"));
+    On("GET /s2", JSONAnswer("{'zo:sessionId':'s2'}"));
+    EXPECT_EQ(load(sessions), kResultSuccess);
+    ASSERT_EQ(sessions.size(), 2u);
+    EXPECT_EQ(sessions.back()->GetIdentifier().view(), "s2");
     On("GET /p1/sessions", ScriptedAnswer::Status(403));
     EXPECT_EQ(load(sessions), kResultHTTPForbidden);
     EXPECT_TRUE(sessions.empty());

@@ -140,6 +140,19 @@ TEST_F(TransactionTest, CommitSendsATitleThatIsReadBackAndRefreshesTheSession) {
     EXPECT_EQ(metadata.metadata.applicationName.view(), "Host");
 }
 
+TEST_F(TransactionTest, ARefreshThatFailsAfterTheCommitLeavesTheSessionAsTheAnswerTellsIt) {
+    ServeTransactions();
+    On("POST /t1/commit", JSONAnswer(SessionBody("c6"), "\"t6\""));
+    On("GET /s1", ScriptedAnswer::Status(503));
+    const auto session = MakeSession();
+    const auto transaction = RFL::QueryInterface<IZOCTransaction>(Open(session, kTransactionType_Edit));
+    Outcome outcome;
+    ASSERT_TRUE(transaction->Commit(Guid::CreateUnique(), outcome.Function(), u""));
+    EXPECT_EQ(outcome.Wait(), kResultSuccess);
+    EXPECT_EQ(session->GetLoadedRevision().view(), "c6");
+    EXPECT_EQ(session->GetETag(true).view(), "\"t6\"");
+}
+
 TEST_F(TransactionTest, AnIngestIsRebasedAndAFailedCommitStaysPending) {
     const auto ingest = MakeTransaction(kIngest);
     On("POST /t1/commit", ScriptedAnswer::Status(412));
