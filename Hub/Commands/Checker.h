@@ -1,4 +1,5 @@
-// Verifies all that the hub holds: hashes, references, trees, commits.
+// Verifies all that the hub holds: hashes, references, trees, commits; sessions with their transactions,
+// conflicts and notes.
 #pragma once
 
 #include <string>
@@ -13,7 +14,7 @@ struct CheckReport {
     std::size_t objects = 0;
     std::size_t contents = 0;
     std::size_t commits = 0;
-    std::size_t unreferenced = 0;  ///< left over from imports that did not end; harmless
+    std::size_t unreferenced = 0;  ///< left over from work that was given up; harmless
 };
 
 CheckReport CheckStorage(Storage& inStorage);

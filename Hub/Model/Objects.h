@@ -18,6 +18,7 @@ struct EnclosureState {
     std::string type;
     std::string content;
     std::uint64_t size = 0;
+    bool isNote = false;  ///< kept with a session and no part of its tree
 };
 
 struct RenditionState {

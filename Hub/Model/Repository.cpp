@@ -114,11 +114,9 @@ AssetState Repository::GetAsset(View const& inView, std::string const& inAssetId
     return std::move(*asset);
 }
 
-std::string Repository::AddContent(std::string_view inBytes) {
-    std::string hash = Sha256Hex(inBytes);
-    if (!mTransaction.HasContent(hash))
-        mTransaction.AddContent(hash, inBytes);
-    return hash;
+void Repository::AddContent(std::string const& inHash, std::string_view inBytes) {
+    if (!mTransaction.HasContent(inHash))
+        mTransaction.AddContent(inHash, inBytes);
 }
 
 void Repository::AddEnclosureReference(std::string const& inScope, EnclosureState const& inEnclosure) {

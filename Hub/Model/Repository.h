@@ -59,8 +59,8 @@ public:
     AssetState LoadAsset(std::string const& inHash);
     TreeRoot LoadTree(std::string const& inHash);
 
-    /// Stores payload bytes and returns their content identifier.
-    std::string AddContent(std::string_view inBytes);
+    /// Stores payload bytes under their hash, which is their content identifier.
+    void AddContent(std::string const& inHash, std::string_view inBytes);
     /// Stores the state with all references that make it readable through lines of that scope.
     std::string AddAsset(std::string const& inScope, AssetState const& inState);
     /// Makes a stored state readable through lines of that scope.

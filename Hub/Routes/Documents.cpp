@@ -6,23 +6,6 @@
 
 namespace zohub {
 
-namespace {
-
-void AppendRaw(std::string& ioTarget, std::string_view inKey, std::string_view inJson) {
-    if (ioTarget.back() != '{')
-        ioTarget += ',';
-    ioTarget += '"';
-    ioTarget += inKey;
-    ioTarget += "\":";
-    ioTarget += inJson;
-}
-
-void BeginLinks(std::string& ioTarget) {
-    ioTarget += ioTarget.back() == '{' ? "\"links\":" : ",\"links\":";
-}
-
-}  // namespace
-
 void LinkWriter::Write(std::string_view inBase, std::string_view inRelation, std::string_view inHref) {
     mTarget += mIsFirst ? "{\"rel\":\"" : ",{\"rel\":\"";
     mIsFirst = false;
@@ -42,13 +25,9 @@ DocumentWriter::DocumentWriter(std::string const& inApi, View const& inView)
 std::string DocumentWriter::TagOf(std::string_view inKind, std::string_view inWhatDecides) const {
     std::string text(inKind);
     text += mView.isPinned ? "\npinned\n" : "\nlive\n";
-    text += IsWritable() ? "w\n" : "r\n";
+    text += IsWritable() ? "w\n" : IsManageable() ? "m\n" : "r\n";
     text += inWhatDecides;
     return MakeETag(text);
-}
-
-std::string DocumentWriter::ProductionTag() const {
-    return TagOf("production", mView.commit.id);
 }
 
 std::string DocumentWriter::AssetTag(std::string_view inHash) const {
@@ -70,61 +49,6 @@ std::string DocumentWriter::AssetHref(std::string const& inAssetId) const {
 
 std::string DocumentWriter::LiveHref(std::string const& inHref) const {
     return mLivePrefix + inHref.substr(mPrefix.size());
-}
-
-void DocumentWriter::AppendIdentity(std::string& ioTarget) const {
-    AppendMember(ioTarget, "zo:productionId", mView.line.id);
-    AppendMember(ioTarget, "zo:commitId", mView.commit.id);
-    AppendMember(ioTarget, "zo:owner", mView.line.owner);
-    AppendMember(ioTarget, "created", FormatTime(mView.line.created));
-    AppendMember(ioTarget, "modified", FormatTime(mView.commit.time));
-    if (!mView.line.metadata.empty())
-        AppendRaw(ioTarget, "metadata", mView.line.metadata);
-    AppendRaw(ioTarget, "properties", mView.tree.properties);
-}
-
-void DocumentWriter::AppendProductionLinks(std::string& ioTarget) const {
-    BeginLinks(ioTarget);
-    LinkWriter links(ioTarget);
-    bool const isTemplate = mView.line.kind == kLineTemplate;
-    links.Plain("self", mPrefix);
-    links.Plain("latest-version", mLivePrefix);
-    links.Plain("up", mApi + (isTemplate ? "/templates" : "/p"));
-    links.Named("/assets", mPrefix + "/a");
-    links.Named("/assets#full", mPrefix + "/full");
-    links.Named("/assets/asset#byId", mLivePrefix + "/at/{commitId}/a/{assetId}");
-    links.Named("/enclosures", mPrefix + "/e");
-    if (IsWritable()) {
-        links.Plain("edit", mLivePrefix);
-        links.Named("/assets/asset#create", mLivePrefix + "/a");
-    }
-    if (!mView.isPinned)
-        links.Named(isTemplate ? "/productions/production#create-production" : "/productions/production#copy",
-                    mLivePrefix + "/copy");
-}
-
-std::string DocumentWriter::Production() const {
-    std::string text = "{";
-    AppendIdentity(text);
-    AppendProductionLinks(text);
-    text += '}';
-    return text;
-}
-
-void DocumentWriter::AppendProductionItem(std::string& ioTarget) const {
-    ioTarget += '{';
-    AppendIdentity(ioTarget);
-    AppendMember(ioTarget, "zo:lastModified", FormatTime(mView.line.modified));
-    AppendMember(ioTarget, "zo:lastModifiedOfAllSessions", FormatTime(mView.line.modified));
-    BeginLinks(ioTarget);
-    {
-        LinkWriter links(ioTarget);
-        links.Plain("self", mLivePrefix);
-        links.Plain("latest-version", mLivePrefix);
-        if (mView.line.kind == kLineTemplate)
-            links.Named("/productions/production#create-production", mLivePrefix + "/copy");
-    }
-    ioTarget += '}';
 }
 
 void DocumentWriter::AppendAsset(std::string& ioTarget, AssetState const& inAsset, std::string const& inHash,
@@ -194,6 +118,8 @@ std::string DocumentWriter::EnclosureList(std::string const& inOwner,
         links.Plain("latest-version", LiveHref(inOwner) + "/e");
         links.Named("/enclosures/enclosure#byContentId", mLivePrefix + "/ce/{contentId}");
         WriteFactoryLinks(links, inOwner + "/e");
+        if (IsManageable() && inOwner == mPrefix)
+            links.Plain("create", inOwner + "/e");
     }
     text += '}';
     return text;
@@ -250,7 +176,7 @@ void DocumentWriter::AppendEnclosure(std::string& ioTarget, std::string const& i
         links.Named("/enclosures/enclosure", mLivePrefix + "/pe/" + inEnclosure.content);
         if (mView.isPinned)
             links.Plain("latest-version", LiveHref(href));
-        if (IsWritable())
+        if (IsWritable() || (inEnclosure.isNote && IsManageable()))
             links.Plain("edit", href);
     }
     ioTarget += '}';

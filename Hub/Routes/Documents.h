@@ -33,6 +33,11 @@ private:
     bool mIsFirst = true;
 };
 
+/// ,"key":<json> with the comma left out after an opening brace.
+void AppendRaw(std::string& ioTarget, std::string_view inKey, std::string_view inJson);
+/// The same for the key "links", whose value a LinkWriter then writes.
+void BeginLinks(std::string& ioTarget);
+
 /// Writes documents of one view of a production. All hrefs begin with the address that the client used.
 class DocumentWriter {
 public:
@@ -46,9 +51,10 @@ public:
     std::string EnclosureTag(EnclosureState const& inEnclosure) const;
     std::string RenditionTag(RenditionState const& inRendition) const;
 
+    /// The document of the line: a production, a template, a session or a transaction.
     std::string Production() const;
-    /// One item of a production list.
-    void AppendProductionItem(std::string& ioTarget) const;
+    /// One item of a production list. The time is that of the last change on the production or a session.
+    void AppendProductionItem(std::string& ioTarget, Micros inLastModifiedOfAll) const;
 
     void AppendAsset(std::string& ioTarget, AssetState const& inAsset, std::string const& inHash,
                      bool inIsFull) const;
@@ -65,6 +71,8 @@ public:
 
     std::string AssetHref(std::string const& inAssetId) const;
     bool IsWritable() const { return mView.mayWrite && !mView.isPinned; }
+    /// The view is the live state of the reader's own session.
+    bool IsManageable() const { return mView.mayManage && !mView.isPinned; }
 
 private:
     std::string TagOf(std::string_view inKind, std::string_view inWhatDecides) const;
@@ -77,12 +85,21 @@ private:
                               AssetState const& inAsset) const;
     void WriteFactoryLinks(LinkWriter& ioLinks, std::string const& inList) const;
     void AppendIdentity(std::string& ioTarget) const;
-    void AppendProductionLinks(std::string& ioTarget) const;
+    void AppendLineLinks(std::string& ioTarget) const;
+    void WriteContentLinks(LinkWriter& ioLinks) const;
+    void WriteProductionLinks(LinkWriter& ioLinks) const;
+    void WriteSessionLinks(LinkWriter& ioLinks) const;
+    void WriteTransactionLinks(LinkWriter& ioLinks) const;
+    std::string ParentPrefix() const;
 
     std::string const& mApi;
     View const& mView;
     std::string const mLivePrefix;
     std::string const mPrefix;
 };
+
+/// One item of the list of a production's sessions, or of a session's transactions.
+void AppendSessionItem(std::string& ioTarget, std::string const& inApi, LineRecord const& inLine);
+void AppendTransactionItem(std::string& ioTarget, std::string const& inApi, LineRecord const& inLine);
 
 }  // namespace zohub

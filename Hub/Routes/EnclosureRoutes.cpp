@@ -36,17 +36,18 @@ Response LoadEnclosure(Call& ioCall, OwnerKind inKind) {
                              200);
 }
 
-std::string TypeOf(FormPart const& inPart) {
-    return inPart.contentType.empty() ? kDefaultType : inPart.contentType;
+Payload PreparePayload(Request const& inRequest) {
+    auto const form = std::make_shared<Form const>(inRequest);
+    FormPart const& part = form->Get(":enclosure");
+    return {form, part.bytes, part.contentType, Sha256Hex(part.bytes)};
 }
 
 Response CreateEnclosure(Call& ioCall, OwnerKind inKind) {
-    Form const form(ioCall.request);
     ItemOwner owner = ItemOwner::ForWriting(ioCall, inKind);
-    FormPart const& payload = form.Get(":enclosure");
+    Payload const& payload = ioCall.payload;
     EnclosureState enclosure;
     enclosure.id = NewKey(kShortKey);
-    enclosure.name = std::string(form.Get(":name").bytes);
+    enclosure.name = std::string(payload.form->Get(":name").bytes);
     if (!IsEnclosureName(enclosure.name))
         throw Failure(
             400, "name-invalid",
@@ -58,27 +59,28 @@ Response CreateEnclosure(Call& ioCall, OwnerKind inKind) {
                           "There is an enclosure of that name already; write to its edit address instead.");
     if (owner.Enclosures().size() >= kMaxEnclosures)
         throw Failure(413, "too-many-enclosures", "No more enclosures can be put here; remove some first.");
-    enclosure.type = TypeOf(payload);
+    enclosure.type = payload.type.empty() ? kDefaultType : payload.type;
     enclosure.size = payload.bytes.size();
-    enclosure.content = ioCall.repository.AddContent(payload.bytes);
+    enclosure.content = payload.hash;
+    ioCall.repository.AddContent(payload.hash, payload.bytes);
+    enclosure.isNote = owner.TakesNotes();
     owner.Enclosures().push_back(enclosure);
     owner.Commit(ioCall, "Added an enclosure");
     return EnclosureResponse(ioCall, owner, enclosure, 201);
 }
 
 Response PutEnclosure(Call& ioCall, OwnerKind inKind) {
-    Form const form(ioCall.request);
     ItemOwner owner = ItemOwner::ForWriting(ioCall, inKind);
-    EnclosureState& enclosure = owner.GetEnclosure(ioCall.parameters[inKind.NextParameter()]);
+    EnclosureState& enclosure = owner.GetEnclosureToChange(ioCall.parameters[inKind.NextParameter()]);
     RequireMatch(ioCall.request, DocumentWriter(ioCall.api, owner.GetView()).EnclosureTag(enclosure),
                  "The enclosure");
-    FormPart const& payload = form.Get(":enclosure");
-    std::string const content = ioCall.repository.AddContent(payload.bytes);
-    if (content != enclosure.content) {
-        enclosure.content = content;
+    Payload const& payload = ioCall.payload;
+    if (payload.hash != enclosure.content) {
+        ioCall.repository.AddContent(payload.hash, payload.bytes);
+        enclosure.content = payload.hash;
         enclosure.size = payload.bytes.size();
-        if (!payload.contentType.empty())
-            enclosure.type = payload.contentType;
+        if (!payload.type.empty())
+            enclosure.type = payload.type;
         owner.Commit(ioCall, "Changed an enclosure");
     }
     return EnclosureResponse(ioCall, owner, enclosure, 200);
@@ -86,7 +88,7 @@ Response PutEnclosure(Call& ioCall, OwnerKind inKind) {
 
 Response DeleteEnclosure(Call& ioCall, OwnerKind inKind) {
     ItemOwner owner = ItemOwner::ForWriting(ioCall, inKind);
-    EnclosureState const enclosure = owner.GetEnclosure(ioCall.parameters[inKind.NextParameter()]);
+    EnclosureState const enclosure = owner.GetEnclosureToChange(ioCall.parameters[inKind.NextParameter()]);
     RequireMatch(ioCall.request, DocumentWriter(ioCall.api, owner.GetView()).EnclosureTag(enclosure),
                  "The enclosure");
     std::erase_if(owner.Enclosures(), [&](EnclosureState const& e) { return e.id == enclosure.id; });
@@ -119,7 +121,7 @@ Response EnclosureByContent(Call& ioCall) {
     return JsonResponse(200, JsonText(document));
 }
 
-Response Payload(Call& ioCall, char const* inKind) {
+Response PayloadOf(Call& ioCall, char const* inKind) {
     ReferenceRecord const reference = GetReference(ioCall, inKind);
     Response response;
     response.etag = "\"" + reference.key + "\"";
@@ -147,9 +149,10 @@ void AddEnclosureRoutes(std::vector<Route>& ioRoutes) {
             if (isPinned)
                 continue;
             ioRoutes.push_back({"POST", list, SignIn::Needed,
-                                [kind](Call& ioCall) { return CreateEnclosure(ioCall, kind); }});
+                                [kind](Call& ioCall) { return CreateEnclosure(ioCall, kind); },
+                                PreparePayload});
             ioRoutes.push_back({"PUT", list + "/{}", SignIn::Needed,
-                                [kind](Call& ioCall) { return PutEnclosure(ioCall, kind); }});
+                                [kind](Call& ioCall) { return PutEnclosure(ioCall, kind); }, PreparePayload});
             ioRoutes.push_back({"DELETE", list + "/{}", SignIn::Needed,
                                 [kind](Call& ioCall) { return DeleteEnclosure(ioCall, kind); }});
         }
@@ -157,9 +160,9 @@ void AddEnclosureRoutes(std::vector<Route>& ioRoutes) {
     std::string const production = OwnerKind().Pattern();
     ioRoutes.push_back({"GET", production + "/ce/{}", SignIn::Needed, EnclosureByContent});
     ioRoutes.push_back({"GET", production + "/pe/{}", SignIn::Needed,
-                        [](Call& ioCall) { return Payload(ioCall, kReferenceEnclosure); }});
+                        [](Call& ioCall) { return PayloadOf(ioCall, kReferenceEnclosure); }});
     ioRoutes.push_back({"GET", production + "/pr/{}", SignIn::Needed,
-                        [](Call& ioCall) { return Payload(ioCall, kReferenceRendition); }});
+                        [](Call& ioCall) { return PayloadOf(ioCall, kReferenceRendition); }});
 }
 
 }  // namespace zohub

@@ -44,7 +44,8 @@ Response AnswerOf(AnswerRecord const& inRecord) {
     return response;
 }
 
-AnswerRecord RecordOf(Response const& inResponse, Call const& inCall, std::string const& inKey) {
+AnswerRecord RecordOf(Response const& inResponse, Call const& inCall, std::string const& inKey,
+                      std::string const& inFingerprint) {
     Json headers = Json::object();
     for (auto const& [name, value] : inResponse.headers)
         headers[name] = value;
@@ -52,12 +53,9 @@ AnswerRecord RecordOf(Response const& inResponse, Call const& inCall, std::strin
         headers["ETag"] = inResponse.etag;
     if (!inResponse.contentType.empty())
         headers["Content-Type"] = inResponse.contentType;
-    return {inCall.actor.name,
-            inKey,
-            Fingerprint(inCall.request),
-            inResponse.status,
-            JsonText(headers),
-            inResponse.body ? inResponse.body->Plain() : std::string(),
+    return {inCall.actor.name, inKey,
+            inFingerprint,     inResponse.status,
+            JsonText(headers), inResponse.body ? inResponse.body->Plain() : std::string(),
             inCall.now};
 }
 
@@ -73,21 +71,32 @@ void FinishRead(Request const& inRequest, Response& ioResponse) {
     ioResponse.contentType.clear();
 }
 
-// Whose token is it? Leaves the actor empty when the request has none that is valid.
-void Identify(Call& ioCall) {
-    std::string const token = ioCall.request.Cookie("login-token");
+struct Identity {
+    Actor actor;
+    std::string tokenHash;
+};
+
+// Whose token is it? Nothing when the request has none that is valid.
+std::optional<Identity> Identify(Request const& inRequest, Transaction& inTransaction, Micros inNow) {
+    std::string const token = inRequest.Cookie("login-token");
     if (token.empty() || token.size() > 256)
-        return;
-    std::string const hash = Sha256Hex(token);
-    auto const record = ioCall.transaction.FindToken(hash);
-    if (!record || record->expires <= ioCall.now)
-        return;
-    auto const user = ioCall.transaction.FindUser(record->user);
+        return std::nullopt;
+    std::string hash = Sha256Hex(token);
+    auto const record = inTransaction.FindToken(hash);
+    if (!record || record->expires <= inNow)
+        return std::nullopt;
+    auto const user = inTransaction.FindUser(record->user);
     if (!user)
-        return;
-    ioCall.actor = {user->name, user->isAdmin};
-    ioCall.tokenHash = hash;
+        return std::nullopt;
+    return Identity{{user->name, user->isAdmin}, std::move(hash)};
 }
+
+[[noreturn]] void FailNotSignedIn() {
+    throw Failure(401, "not-signed-in", "The request has no valid login token; sign in and repeat it.");
+}
+
+// So long that one looks first whether the sender may send anything.
+constexpr std::size_t kLargeBody = 64 * 1024;
 
 }  // namespace
 
@@ -126,6 +135,11 @@ Hub::Hub(Storage& inStorage, HubSettings inSettings, Clock inClock)
     AddEnclosureRoutes(routes);
     AddRenditionRoutes(routes);
     AddLocatorRoutes(routes);
+    AddSessionRoutes(routes);
+    AddTransactionRoutes(routes);
+    AddHistoryRoutes(routes);
+    AddDifferenceRoutes(routes);
+    AddAcceptRoutes(routes);
     for (auto& route : routes) {
         CompiledRoute compiled;
         for (auto segment : Split(route.pattern, '/'))
@@ -193,26 +207,49 @@ Response Hub::Run(Request const& inRequest) {
     return RunRoute(inRequest, FindRoute(inRequest));
 }
 
-Response Hub::RunRoute(Request const& inRequest, Match const& inMatch) {
-    auto const transaction = inRequest.IsRead() ? mStorage.BeginRead() : mStorage.BeginWrite();
-    Call call{inRequest,    inMatch.parameters,
-              mSettings,    mCache,
-              *transaction, Repository(*transaction),
-              Actor(),      std::string(),
-              mClock(),     inRequest.baseUrl + "/" + kApiPath};
-    Identify(call);
-    if (inMatch.route->signIn == SignIn::Needed && call.actor.name.empty())
-        throw Failure(401, "not-signed-in", "The request has no valid login token; sign in and repeat it.");
-    return inRequest.IsRead() ? inMatch.route->handle(call) : RunMutation(call, *inMatch.route);
+// Before much work is done for a request, and outside of the lock that its own transaction will hold.
+void Hub::RefuseStrangers(Request const& inRequest, Route const& inRoute) const {
+    bool const isCheap = inRequest.body.size() < kLargeBody;
+    if (isCheap || inRoute.signIn != SignIn::Needed)
+        return;
+    if (!Identify(inRequest, *mStorage.BeginRead(), mClock()))
+        FailNotSignedIn();
 }
 
-Response Hub::RunMutation(Call& ioCall, Route const& inRoute) {
+Response Hub::RunRoute(Request const& inRequest, Match const& inMatch) {
+    Route const& route = *inMatch.route;
+    Payload payload;
+    std::string fingerprint;
+    if (!inRequest.IsRead()) {
+        RefuseStrangers(inRequest, route);
+        if (route.prepare)
+            payload = route.prepare(inRequest);
+        if (!inRequest.Header("Idempotency-Key").empty())
+            fingerprint = Fingerprint(inRequest);
+    }
+    auto const transaction = inRequest.IsRead() ? mStorage.BeginRead() : mStorage.BeginWrite();
+    Call call{inRequest,         inMatch.parameters,
+              mSettings,         mCache,
+              *transaction,      Repository(*transaction),
+              Actor(),           std::string(),
+              mClock(),          inRequest.baseUrl + "/" + kApiPath,
+              std::move(payload)};
+    if (auto identity = Identify(inRequest, *transaction, call.now)) {
+        call.actor = std::move(identity->actor);
+        call.tokenHash = std::move(identity->tokenHash);
+    }
+    if (route.signIn == SignIn::Needed && call.actor.name.empty())
+        FailNotSignedIn();
+    return inRequest.IsRead() ? route.handle(call) : RunMutation(call, route, fingerprint);
+}
+
+Response Hub::RunMutation(Call& ioCall, Route const& inRoute, std::string const& inFingerprint) {
     std::string const key(ioCall.request.Header("Idempotency-Key"));
     if (key.size() > kMaxIdempotencyKey)
         throw Failure(400, "idempotency-key-too-long", "An Idempotency-Key has at most 128 bytes.");
     if (!key.empty()) {
         auto const stored = ioCall.transaction.FindAnswer(ioCall.actor.name, key, ioCall.now - kDay);
-        if (stored && stored->fingerprint != Fingerprint(ioCall.request))
+        if (stored && stored->fingerprint != inFingerprint)
             throw Failure(422, "idempotency-key-reused",
                           "This Idempotency-Key belongs to another request; use a fresh one.");
         if (stored)
@@ -221,7 +258,7 @@ Response Hub::RunMutation(Call& ioCall, Route const& inRoute) {
     Response response = inRoute.handle(ioCall);
     if (!key.empty()) {
         ioCall.transaction.RemoveAnswersBefore(ioCall.now - kDay);
-        ioCall.transaction.AddAnswer(RecordOf(response, ioCall, key));
+        ioCall.transaction.AddAnswer(RecordOf(response, ioCall, key, inFingerprint));
     }
     ioCall.transaction.Commit();
     return response;

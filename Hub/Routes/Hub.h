@@ -8,6 +8,7 @@
 
 #include "Base/Clock.h"
 #include "Http/Message.h"
+#include "Http/Multipart.h"
 #include "Http/Server.h"
 #include "Model/Repository.h"
 #include "Routes/DocumentCache.h"
@@ -23,6 +24,14 @@ struct HubSettings {
     std::size_t documentCacheBytes = 384u << 20;
 };
 
+/// What a route makes of a large body before the database is locked for writing.
+struct Payload {
+    std::shared_ptr<Form const> form;  ///< when the payload came as a field of one
+    std::string_view bytes;            ///< in the request's body
+    std::string type;                  ///< media type as the client stated it, or empty
+    std::string hash;
+};
+
 /// One request on its way through a route, inside its database transaction.
 struct Call {
     Request const& request;
@@ -35,6 +44,7 @@ struct Call {
     std::string tokenHash;  ///< of the token that the request came with
     Micros now = 0;
     std::string api;  ///< "http://host:port/zo/1"
+    Payload payload;  ///< of a route that prepares one
 
     /// For documents whose tag is known before they are made: the 304, when the client has them already.
     bool HasCurrent(std::string const& inETag) const { return IfNoneMatchHits(request, inETag); }
@@ -47,6 +57,7 @@ struct Route {
     std::string pattern;  ///< "p/{}/a"; {} stands for one segment
     SignIn signIn = SignIn::Needed;
     std::function<Response(Call&)> handle;
+    std::function<Payload(Request const&)> prepare = nullptr;
 };
 
 inline constexpr char kApiPath[] = "zo/1";
@@ -67,7 +78,8 @@ private:
     Match FindRoute(Request const& inRequest) const;
     Response Run(Request const& inRequest);
     Response RunRoute(Request const& inRequest, Match const& inMatch);
-    Response RunMutation(Call& ioCall, Route const& inRoute);
+    Response RunMutation(Call& ioCall, Route const& inRoute, std::string const& inFingerprint);
+    void RefuseStrangers(Request const& inRequest, Route const& inRoute) const;
 
     struct CompiledRoute;
     Storage& mStorage;

@@ -20,13 +20,25 @@ ItemOwner::ItemOwner(Call& ioCall, OwnerKind inKind)
 ItemOwner::ItemOwner(Call& ioCall, OwnerKind inKind, View inView)
     : mIsAsset(inKind.isAsset), mView(std::move(inView)), mApi(ioCall.api) {
     if (mIsAsset)
-        mAsset = ioCall.repository.GetAsset(mView, ioCall.parameters[inKind.NextParameter() - 1], &mHash);
-    else
-        mHash = mView.commit.tree;
+        mAsset = ioCall.repository.GetAsset(mView, ioCall.parameters[inKind.NextParameter() - 1]);
+    else if (mView.IsSession() && !mView.isPinned)
+        LoadNotes(ioCall.transaction);
 }
 
 ItemOwner ItemOwner::ForWriting(Call& ioCall, OwnerKind inKind) {
-    return ItemOwner(ioCall, inKind, OpenForWriting(ioCall));
+    View view = OpenView(ioCall, false);
+    bool const isNote = !inKind.isAsset && view.IsSession();
+    if (isNote)
+        RequireManager(view);
+    else
+        RequireWritable(view);
+    return ItemOwner(ioCall, inKind, std::move(view));
+}
+
+void ItemOwner::LoadNotes(Transaction& inTransaction) {
+    mNotes = inTransaction.ListNotes(mView.line.id);
+    for (auto const& note : mNotes)
+        Enclosures().push_back({note.id, note.name, note.type, note.content, note.size, true});
 }
 
 std::string ItemOwner::Href() const {
@@ -41,6 +53,13 @@ EnclosureState& ItemOwner::GetEnclosure(std::string const& inId) {
     return *enclosure;
 }
 
+EnclosureState& ItemOwner::GetEnclosureToChange(std::string const& inId) {
+    EnclosureState& enclosure = GetEnclosure(inId);
+    if (TakesNotes() && !enclosure.isNote)
+        RequireWritable(mView);
+    return enclosure;
+}
+
 RenditionState& ItemOwner::GetRendition(std::string const& inId) {
     RenditionState* const rendition = FindItem(Renditions(), inId);
     if (!rendition)
@@ -49,18 +68,31 @@ RenditionState& ItemOwner::GetRendition(std::string const& inId) {
 }
 
 void ItemOwner::Commit(Call& ioCall, std::string const& inTitle) {
+    if (TakesNotes())
+        return WriteNotes(ioCall);
+    std::string const& scope = ScopeOf(mView.line);
     Repository::Edit edit;
     if (mIsAsset) {
-        mHash = ioCall.repository.AddAsset(ScopeOf(mView.line), mAsset);
-        edit.assets[mAsset.id] = mHash;
+        edit.assets[mAsset.id] = ioCall.repository.AddAsset(scope, mAsset);
     } else {
         for (auto const& enclosure : mView.tree.enclosures)
-            ioCall.repository.AddEnclosureReference(ScopeOf(mView.line), enclosure);
+            ioCall.repository.AddEnclosureReference(scope, enclosure);
         edit.enclosures = mView.tree.enclosures;
     }
     ioCall.repository.CommitEdit(mView, edit, inTitle, ioCall.actor, ioCall.now);
-    if (!mIsAsset)
-        mHash = mView.commit.tree;
+}
+
+void ItemOwner::WriteNotes(Call& ioCall) {
+    std::string const& session = mView.line.id;
+    for (auto const& before : mNotes)
+        if (!FindItem(Enclosures(), before.id))
+            ioCall.transaction.RemoveNote(session, before.id);
+    for (auto const& note : Enclosures()) {
+        if (!note.isNote)
+            continue;
+        ioCall.repository.AddEnclosureReference(session, note);
+        ioCall.transaction.PutNote({session, note.id, note.name, note.type, note.content, note.size});
+    }
 }
 
 }  // namespace zohub

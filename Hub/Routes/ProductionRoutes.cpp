@@ -1,6 +1,9 @@
 // Productions and templates: lists, creation, loading at a commit, properties, copies.
+#include <set>
+
 #include "Base/Error.h"
 #include "Base/Text.h"
+#include "Routes/Creation.h"
 #include "Routes/Documents.h"
 #include "Routes/RouteTable.h"
 
@@ -8,13 +11,8 @@ namespace zohub {
 
 namespace {
 
-Response ProductionResponse(Call& ioCall, View const& inView, int inStatus) {
-    DocumentWriter const writer(ioCall.api, inView);
-    Response response = JsonResponse(inStatus, writer.Production());
-    response.etag = writer.ProductionTag();
-    if (inStatus == 201)
-        response.headers.emplace_back("Location", writer.LivePrefix());
-    return response;
+Creation BodyOf(Call& ioCall) {
+    return ReadCreation(ParseJsonObject(ioCall.request.body, "The body of the creation"));
 }
 
 Response ListOf(Call& ioCall, std::string const& inKind, std::string const& inSelf, bool inMayCreate) {
@@ -26,7 +24,8 @@ Response ListOf(Call& ioCall, std::string const& inKind, std::string const& inSe
         View const view = ioCall.repository.Open(line.id, "", ioCall.actor);
         if (text.back() != '[')
             text += ',';
-        DocumentWriter(ioCall.api, view).AppendProductionItem(text);
+        DocumentWriter(ioCall.api, view)
+            .AppendProductionItem(text, ioCall.transaction.LastModifiedOf(line.id));
     }
     text += "],\"links\":";
     {
@@ -47,25 +46,6 @@ Response ListTemplates(Call& ioCall) {
     return ListOf(ioCall, kLineTemplate, ioCall.api + "/templates", false);
 }
 
-struct Creation {
-    std::string name;
-    std::string description;
-    bool isTemporary = false;
-};
-
-Creation ReadCreation(Call& ioCall) {
-    Json const body = ParseJsonObject(ioCall.request.body, "The body of the creation");
-    CheckKeys(
-        body,
-        {{"name", JsonKind::String}, {"description", JsonKind::String}, {"isTemporary", JsonKind::Boolean}},
-        "the body of the creation");
-    CheckProductionProperties(body);
-    Creation creation{StringUnder(body, "name"), StringUnder(body, "description"), false};
-    if (body.contains("isTemporary"))
-        creation.isTemporary = body["isTemporary"].get<bool>();
-    return creation;
-}
-
 std::string PropertiesOf(Creation const& inCreation, Json inProperties) {
     inProperties["name"] = inCreation.name;
     inProperties["description"] = inCreation.description;
@@ -73,24 +53,25 @@ std::string PropertiesOf(Creation const& inCreation, Json inProperties) {
 }
 
 Response CreateProduction(Call& ioCall) {
-    Creation const creation = ReadCreation(ioCall);
+    Creation const creation = BodyOf(ioCall);
     TreeRoot tree;
     tree.properties = PropertiesOf(creation, Json::object());
     auto const line = ioCall.repository.CreateLine(kLineProduction, tree, "Created " + creation.name,
                                                    ioCall.actor, creation.isTemporary, ioCall.now);
-    return ProductionResponse(ioCall, ioCall.repository.Open(line.id, "", ioCall.actor), 201);
+    return LineResponse(ioCall, ioCall.repository.Open(line.id, "", ioCall.actor), 201);
 }
 
 // From a template as well: what is made is always a production of the one who asks.
 Response CopyProduction(Call& ioCall) {
     View const source = OpenView(ioCall, false);
-    Creation const creation = ReadCreation(ioCall);
+    Creation const creation = BodyOf(ioCall);
     TreeRoot tree = source.tree;
     tree.properties = PropertiesOf(creation, Json::parse(source.tree.properties));
     auto const line = ioCall.repository.CreateLine(kLineProduction, tree, "Copied to " + creation.name,
                                                    ioCall.actor, creation.isTemporary, ioCall.now);
-    ioCall.transaction.CopyReferences(source.line.production, line.id);
-    return ProductionResponse(ioCall, ioCall.repository.Open(line.id, "", ioCall.actor), 201);
+    for (auto const& scope : std::set{source.line.production, ScopeOf(source.line)})
+        ioCall.transaction.CopyReferences(scope, line.id);
+    return LineResponse(ioCall, ioCall.repository.Open(line.id, "", ioCall.actor), 201);
 }
 
 Response EditProduction(Call& ioCall) {
@@ -102,7 +83,7 @@ Response EditProduction(Call& ioCall) {
     edit.properties = JsonText(properties);
     if (*edit.properties != view.tree.properties)
         ioCall.repository.CommitEdit(view, edit, "Changed the properties", ioCall.actor, ioCall.now);
-    return ProductionResponse(ioCall, view, 200);
+    return LineResponse(ioCall, view, 200);
 }
 
 }  // namespace
@@ -112,12 +93,46 @@ View OpenView(Call& ioCall, bool inIsPinned) {
                                   ioCall.actor);
 }
 
+void RequireWritable(View const& inView) {
+    if (inView.mayWrite)
+        return;
+    if (inView.line.isEnded)
+        throw Failure(409, "transaction-ended",
+                      "The transaction was committed; open another one on its session.");
+    if (inView.mayManage)
+        throw Failure(403, "transaction-needed",
+                      "A session is written to through a transaction; open one and write there.");
+    throw Failure(403, "not-permitted",
+                  inView.line.kind == kLineTemplate
+                      ? "You may read this template but not change it; make a production of it."
+                      : "Only its owner may change a session or a transaction.");
+}
+
 View OpenForWriting(Call& ioCall) {
     View view = OpenView(ioCall, false);
-    if (!view.mayWrite)
-        throw Failure(403, "not-permitted",
-                      "You may read this template but not change it; make a production of it.");
+    RequireWritable(view);
     return view;
+}
+
+Response LineResponse(Call& ioCall, View const& inView, int inStatus) {
+    DocumentWriter const writer(ioCall.api, inView);
+    Response response = JsonResponse(inStatus, writer.Production());
+    response.etag = writer.ProductionTag();
+    if (inStatus == 201)
+        response.headers.emplace_back("Location", writer.LivePrefix());
+    return response;
+}
+
+Creation ReadCreation(Json const& inBody) {
+    CheckKeys(
+        inBody,
+        {{"name", JsonKind::String}, {"description", JsonKind::String}, {"isTemporary", JsonKind::Boolean}},
+        "the body of the creation");
+    CheckProductionProperties(inBody);
+    Creation creation{StringUnder(inBody, "name"), StringUnder(inBody, "description"), false};
+    if (inBody.contains("isTemporary"))
+        creation.isTemporary = inBody["isTemporary"].get<bool>();
+    return creation;
 }
 
 void AddProductionRoutes(std::vector<Route>& ioRoutes) {
@@ -125,12 +140,10 @@ void AddProductionRoutes(std::vector<Route>& ioRoutes) {
     ioRoutes.push_back({"GET", base, SignIn::Needed, ListProductions});
     ioRoutes.push_back({"POST", base, SignIn::Needed, CreateProduction});
     ioRoutes.push_back({"GET", std::string(kApiPath) + "/templates", SignIn::Needed, ListTemplates});
-    ioRoutes.push_back({"GET", base + "/{}", SignIn::Needed, [](Call& ioCall) {
-                            return ProductionResponse(ioCall, OpenView(ioCall, false), 200);
-                        }});
-    ioRoutes.push_back({"GET", base + "/{}/at/{}", SignIn::Needed, [](Call& ioCall) {
-                            return ProductionResponse(ioCall, OpenView(ioCall, true), 200);
-                        }});
+    ioRoutes.push_back({"GET", base + "/{}", SignIn::Needed,
+                        [](Call& ioCall) { return LineResponse(ioCall, OpenView(ioCall, false), 200); }});
+    ioRoutes.push_back({"GET", base + "/{}/at/{}", SignIn::Needed,
+                        [](Call& ioCall) { return LineResponse(ioCall, OpenView(ioCall, true), 200); }});
     ioRoutes.push_back({"PUT", base + "/{}", SignIn::Needed, EditProduction});
     ioRoutes.push_back({"POST", base + "/{}/copy", SignIn::Needed, CopyProduction});
 }

@@ -34,6 +34,10 @@ Response LoadRendition(Call& ioCall, OwnerKind inKind) {
                              200);
 }
 
+Payload PreparePayload(Request const& inRequest) {
+    return {nullptr, inRequest.body, std::string(), Sha256Hex(inRequest.body)};
+}
+
 std::string FlavourOf(Request const& inRequest) {
     std::string type(inRequest.Header("Content-Type"));
     if (!IsMediaType(type))
@@ -50,7 +54,8 @@ Response CreateRendition(Call& ioCall, OwnerKind inKind) {
     rendition.id = NewKey(kShortKey);
     rendition.type = FlavourOf(ioCall.request);
     rendition.size = ioCall.request.body.size();
-    rendition.content = ioCall.repository.AddContent(ioCall.request.body);
+    rendition.content = ioCall.payload.hash;
+    ioCall.repository.AddContent(ioCall.payload.hash, ioCall.request.body);
     owner.Renditions().push_back(rendition);
     owner.Commit(ioCall, "Added a rendition");
     return RenditionResponse(ioCall, owner, rendition, 201);
@@ -74,8 +79,9 @@ Response PutMedia(Call& ioCall, OwnerKind inKind) {
     if (!IfMatchHolds(ioCall.request, "\"" + rendition.content + "\""))
         RequireMatch(ioCall.request, DocumentWriter(ioCall.api, owner.GetView()).RenditionTag(rendition),
                      "The rendition");
-    std::string const content = ioCall.repository.AddContent(ioCall.request.body);
+    std::string const& content = ioCall.payload.hash;
     std::string const type = FlavourOf(ioCall.request);
+    ioCall.repository.AddContent(content, ioCall.request.body);
     if (content != rendition.content || type != rendition.type) {
         rendition.content = content;
         rendition.type = type;
@@ -99,10 +105,12 @@ Response DeleteRendition(Call& ioCall, OwnerKind inKind) {
 
 void AddRenditionRoutes(std::vector<Route>& ioRoutes) {
     using Handler = Response (*)(Call&, OwnerKind);
+    using Prepare = Payload (*)(Request const&);
     auto const add = [&ioRoutes](char const* inMethod, OwnerKind inKind, char const* inTail,
-                                 Handler inHandler) {
+                                 Handler inHandler, Prepare inPrepare = nullptr) {
         ioRoutes.push_back({inMethod, inKind.Pattern() + "/r" + inTail, SignIn::Needed,
-                            [inKind, inHandler](Call& ioCall) { return inHandler(ioCall, inKind); }});
+                            [inKind, inHandler](Call& ioCall) { return inHandler(ioCall, inKind); },
+                            inPrepare});
     };
     for (bool isPinned : {false, true}) {
         OwnerKind const kind{true, isPinned};
@@ -111,8 +119,8 @@ void AddRenditionRoutes(std::vector<Route>& ioRoutes) {
         add("GET", kind, "/{}/media", LoadMedia);
     }
     OwnerKind const live{true, false};
-    add("POST", live, "", CreateRendition);
-    add("PUT", live, "/{}/media", PutMedia);
+    add("POST", live, "", CreateRendition, PreparePayload);
+    add("PUT", live, "/{}/media", PutMedia, PreparePayload);
     add("DELETE", live, "/{}", DeleteRendition);
 }
 
