@@ -1,5 +1,8 @@
 // Dialogs as their logic sees them: answered by a script, closed from elsewhere, or with nobody to ask; and
 // the progress window around an operation.
+#include <pty.h>
+#include <unistd.h>
+
 #include <thread>
 
 #include <gmock/gmock.h>
@@ -8,6 +11,7 @@
 #include "Frame/ProgressWindow.h"
 #include "ostcore/threads/MainThread.h"
 #include "ostui/MessageBox.h"
+#include "ostui/TerminalBackEnd.h"
 #include "ZOClient/Types.h"
 #include "ZOClientTesting/ScriptedWindows.h"
 
@@ -186,6 +190,93 @@ TEST_F(WindowsTest, TheSecondButtonAsksAndClosesOnlyWhenItMay) {
     EXPECT_EQ(operation->aborts, 0);
     EXPECT_THAT(windows.Mismatches(), IsEmpty());
     EXPECT_EQ(windows.Shown().size(), 3u);
+}
+
+/// A terminal whose user the test plays.
+class Terminal {
+public:
+    Terminal() { EXPECT_EQ(openpty(&mUser, &mProgram, nullptr, nullptr, nullptr), 0); }
+    ~Terminal() {
+        close(mUser);
+        close(mProgram);
+    }
+    Terminal(const Terminal&) = delete;
+    Terminal& operator=(const Terminal&) = delete;
+
+    int Program() const { return mProgram; }
+    void Type(const std::string& inText) {
+        EXPECT_EQ(write(mUser, inText.data(), inText.size()), static_cast<ssize_t>(inText.size()));
+    }
+    /// Reads until the text has appeared; all that was shown since the last call.
+    std::string WaitFor(const std::string& inText) {
+        std::string shown;
+        char character = 0;
+        while (shown.find(inText) == std::string::npos && read(mUser, &character, 1) == 1) {
+            shown += character;
+        }
+        return shown;
+    }
+
+private:
+    int mUser = -1;
+    int mProgram = -1;
+};
+
+TEST_F(WindowsTest, ATerminalAsksLineByLineAndShowsNoPassword) {
+    Terminal terminal;
+    const auto former =
+        ostui::SetBackEnd(ostui::CreateTerminalBackEnd({terminal.Program(), terminal.Program(), {}}));
+    ostui::Dialog dialog("Sign", "");
+    dialog.AddStaticText("text", "Who are \x1b[31myou?");
+    dialog.AddTextEdit("user", "User", "anna");
+    dialog.AddPasswordEdit("password", "Password");
+    dialog.AddButton("ok", "Sign In", ostui::kResponseOK);
+    dialog.AddButton("cancel", "Cancel", ostui::kResponseCancel);
+    std::string shown;
+    std::thread user([&] {
+        shown = terminal.WaitFor("User [anna]: ");
+        terminal.Type("\n");
+        shown += terminal.WaitFor("Password: ");
+        terminal.Type("hidden\n");
+        shown += terminal.WaitFor("> ");
+        terminal.Type("1\n");
+    });
+    EXPECT_EQ(dialog.RunModal(), ostui::kResponseOK);
+    user.join();
+    EXPECT_EQ(dialog.GetText("user"), "anna");
+    EXPECT_EQ(dialog.GetText("password"), "hidden");
+    EXPECT_EQ(shown.find("hidden"), std::string::npos) << shown;
+    EXPECT_EQ(shown.find('\x1b'), std::string::npos) << "what a server says steered the terminal";
+
+    // A window that waits takes a button while the operation runs.
+    settings.caption = "Working";
+    std::thread impatient([&] {
+        terminal.WaitFor("> ");
+        terminal.Type("cancel\n");
+    });
+    EXPECT_EQ(RunProgressWindow(operation, settings), ProgressEnd::kCancelled);
+    impatient.join();
+    ostui::SetBackEnd(former);
+}
+
+TEST_F(WindowsTest, OffATerminalNothingIsAskedAndAnInterruptDismisses) {
+    int ends[2];
+    ASSERT_EQ(pipe(ends), 0);
+    bool isInterrupted = false;
+    const auto former =
+        ostui::SetBackEnd(ostui::CreateTerminalBackEnd({ends[0], ends[1], [&] { return isInterrupted; }}));
+    ostui::MessageBoxSettings question;
+    question.message = "Discard?";
+    question.buttons = ostui::kMessageBoxYes | ostui::kMessageBoxNo;
+    question.defaultButton = ostui::kMessageBoxYes;
+    EXPECT_EQ(ostui::RunMessageBox(question), ostui::kMessageBoxNo);
+    ostcore::threads::AsyncCallFromMainThread([&] { isInterrupted = true; });
+    EXPECT_EQ(RunProgressWindow(operation, settings), ProgressEnd::kCancelled);
+    close(ends[1]);
+    char byte = 0;
+    EXPECT_EQ(read(ends[0], &byte, 1), 0) << "something was written";
+    close(ends[0]);
+    ostui::SetBackEnd(former);
 }
 
 }  // namespace

@@ -7,6 +7,7 @@
 #include <string>
 #include <thread>
 
+#include <fcntl.h>
 #include <signal.h>
 #include <sys/resource.h>
 #include <sys/stat.h>
@@ -104,6 +105,31 @@ TEST(File, ReadersNeverSeeAHalfWrittenFile) {
     done = true;
     reader.join();
     EXPECT_EQ(wrong, 0);
+}
+
+TEST(File, WhatIsWrittenToWhileItIsReadIsRefused) {
+    const TemporaryDirectory directory;
+    const std::string path = directory.Path("growing");
+    ASSERT_TRUE(File::ReplaceAtomically(path, std::string(16u << 20, 'x')));
+    std::atomic<bool> isOver{false};
+    std::thread writer([&] {
+        const int file = ::open(path.c_str(), O_WRONLY | O_CLOEXEC);
+        while (!isOver) {
+            EXPECT_EQ(::pwrite(file, "y", 1, 0), 1);
+        }
+        ::close(file);
+    });
+    std::string reason;
+    bool isRefused = false;
+    // Of a read that fits between two ticks of the file system's clock nothing can be told.
+    for (int attempt = 0; attempt < 200 && !isRefused; ++attempt) {
+        isRefused = !File::Read(path, kDefaultMaximumFileSize, &reason);
+    }
+    isOver = true;
+    writer.join();
+    EXPECT_TRUE(isRefused);
+    EXPECT_NE(reason.find("it was changed meanwhile"), std::string::npos) << reason;
+    EXPECT_TRUE(File::Read(path));
 }
 
 TEST(File, ReadsUpToTheBoundAndRefusesWhatIsNoFile) {
