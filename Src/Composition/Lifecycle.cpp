@@ -12,6 +12,7 @@
 #include "Resources/PollingResourceMonitor.h"
 #include "RFL/Registry.h"
 #include "ZOClient/Library.h"
+#include "ZOClient/ZOSandbox.h"
 
 namespace ZOCL {
 
@@ -40,6 +41,7 @@ void Shutdown() {
     }
     StopAutoAuthentication();
     ResetSyslogLogger();
+    SetCurrentZOSandbox(nullptr);
     // Before the network goes, which the polls use.
     PollingResourceMonitor::CancelAllOutstandingPolls(true);
     // The network's last completions still make resources, so the factory goes after it.

@@ -213,6 +213,10 @@ TEST_F(SandboxTest, ThereIsOneCurrentSandboxOrNone) {
     EXPECT_TRUE(UpdateCurrentZOSandboxAsync());
     Settle();
     EXPECT_EQ(State(), "S----");
+    // It holds the server, so it goes with the library.
+    Initialize();
+    Shutdown();
+    EXPECT_FALSE(GetCurrentZOSandbox());
 }
 
 }  // namespace
