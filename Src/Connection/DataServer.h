@@ -189,7 +189,7 @@ private:
     void InitFromDiscoveryURL(const Settings& inSettings);
     void UpdateLoginData() ZO_REQUIRES(IZOCDataServer::GetLock());
     bool BecomeLoggedInServer();
-    void OnRenewed(int inResult, const InterfaceRef<IZOCDataServer>& inServer);
+    void OnRenewed(const Guid& inRequest, int inResult, const InterfaceRef<IZOCDataServer>& inServer);
     void PromptForReconnect();
     /// False when the user gave up.
     bool AskUntilReconnected(ReconnectDialog& ioDialog, const ZOLoginData& inLoginData);

@@ -61,17 +61,25 @@ void DataServer::GetNewAuthToken() {
         return;
     }
     const auto onRenewed = [self = InterfaceRef<DataServer>(this)](
-                               const Guid&, const InterfaceRef<IZOCDataServer>& inServer, int inResult,
-                               const shared_ptr<ostnet::Response>&) { self->OnRenewed(inResult, inServer); };
+                               const Guid& inRequest, const InterfaceRef<IZOCDataServer>& inServer,
+                               int inResult, const shared_ptr<ostnet::Response>&) {
+        self->OnRenewed(inRequest, inResult, inServer);
+    };
     if (!Authenticate(onRenewed, request)) {
-        OnRenewed(kResultNotStarted, nullptr);
+        OnRenewed(request, kResultNotStarted, nullptr);
     }
 }
 
-void DataServer::OnRenewed(int inResult, const InterfaceRef<IZOCDataServer>& inServer) {
+// A token works from the moment that the login form is answered, and can be refused before the sign-in that
+// brought it has run to its end. Then the next sign-in is under way already, and what waits is its business.
+void DataServer::OnRenewed(const Guid& inRequest, int inResult,
+                           const InterfaceRef<IZOCDataServer>& inServer) {
     bool useHasEnded = false;
     {
         ScopedLock lock(IZOCDataServer::GetLock(), "DataServer::OnRenewed");
+        if (mRenewal != inRequest) {
+            return;
+        }
         useHasEnded = mUseHasEnded;
         mRenewal = Guid();
     }
@@ -85,10 +93,9 @@ void DataServer::OnRenewed(int inResult, const InterfaceRef<IZOCDataServer>& inS
                                   .Add("server", mBaseURL.view())
                                   .Add("result", GetResultName(inResult)));
     }
-    // Whatever way the sequence ended, nobody waits for a token that does not come.
-    if (GetToken().IsNull()) {
-        mChain.authorization->SetAuthToken(ImmutableString());
-    }
+    // Whatever way the sequence ended, nobody waits for a token that does not come. One that was adopted
+    // meanwhile stays good.
+    mChain.authorization->SetAuthToken(GetToken());
     if (!useHasEnded) {
         ReportFatalHeadlessError(kRenewalFailed);
     }

@@ -5,6 +5,15 @@
 
 namespace ZOCL {
 
+namespace {
+
+/// One copy for all sendings: a packed request is copied from hand to hand, and a form can be large.
+shared_ptr<ostnet::http::Form const> Keep(const ostnet::http::Form& inForm) {
+    return boost::make_shared<ostnet::http::Form>(inForm);
+}
+
+}  // namespace
+
 void AuthorizationProcessor::AddAuthorizationHeaders(const ImmutableString& inToken, Headers& ioHeaders) {
     if (!inToken.IsNull()) {
         ioHeaders.emplace(ostnet::kHEADER_COOKIE, inToken);
@@ -47,9 +56,9 @@ bool AuthorizationProcessor::PUT(const Guid& inRequestID, const CompletionFuncti
 bool AuthorizationProcessor::PUT(const Guid& inRequestID, const CompletionFunction& inCompletion,
                                  const ImmutableString& inURL, Headers inHeaders, const Form& inForm,
                                  const RequestOptions& inOptions) {
-    PackedRequest packed = [this, inRequestID, inURL, headers = std::move(inHeaders), inForm, inOptions](
-                               const ImmutableString& inToken, const CompletionFunction& inDone) {
-        return SendPUT(inToken, inRequestID, inDone, inURL, headers, inForm, inOptions);
+    PackedRequest packed = [this, inRequestID, inURL, headers = std::move(inHeaders), form = Keep(inForm),
+                            inOptions](const ImmutableString& inToken, const CompletionFunction& inDone) {
+        return SendPUT(inToken, inRequestID, inDone, inURL, headers, *form, inOptions);
     };
     return MakeRequest(inRequestID, std::move(packed), inCompletion);
 }
@@ -67,9 +76,9 @@ bool AuthorizationProcessor::POST(const Guid& inRequestID, const CompletionFunct
 bool AuthorizationProcessor::POST(const Guid& inRequestID, const CompletionFunction& inCompletion,
                                   const ImmutableString& inURL, Headers inHeaders, const Form& inForm,
                                   const RequestOptions& inOptions) {
-    PackedRequest packed = [this, inRequestID, inURL, headers = std::move(inHeaders), inForm, inOptions](
-                               const ImmutableString& inToken, const CompletionFunction& inDone) {
-        return SendPOST(inToken, inRequestID, inDone, inURL, headers, inForm, inOptions);
+    PackedRequest packed = [this, inRequestID, inURL, headers = std::move(inHeaders), form = Keep(inForm),
+                            inOptions](const ImmutableString& inToken, const CompletionFunction& inDone) {
+        return SendPOST(inToken, inRequestID, inDone, inURL, headers, *form, inOptions);
     };
     return MakeRequest(inRequestID, std::move(packed), inCompletion);
 }
