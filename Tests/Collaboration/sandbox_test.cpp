@@ -1,4 +1,6 @@
 // What a sandbox shows, when it tells its host, and updates whose answers come in every order.
+#include <algorithm>
+
 #include "SandboxTest.h"
 
 namespace ZOCL {
@@ -171,19 +173,30 @@ TEST_F(SandboxTest, TheTwoAnswersMayComeInAnyOrder) {
 }
 
 TEST_F(SandboxTest, ALateUpdateDoesNotUndoALaterOne) {
-    MakeSandbox();
-    Answer("/out", ScriptedAnswer::Hold());
-    Update();
-    Update();
-    const auto ids = RequestsFor("/out");
-    ASSERT_EQ(ids.size(), 2u);
-    net->Release(ids[1], DifferencesAnswer("c1", kConflict));
-    Settle();
-    EXPECT_EQ(State(), "SDC--");
-    net->Release(ids[0], DifferencesAnswer("c0", ""));
-    Settle();
-    EXPECT_EQ(State(), "SDC--");
-    EXPECT_EQ(changes, 1);
+    struct Update {
+        ScriptedAnswer answer;
+        const char* state;
+    };
+    const Update updates[] = {{DifferencesAnswer("c0", ""), "-----"},
+                              {DifferencesAnswer("c1", ""), "S----"},
+                              {DifferencesAnswer("c1", kConflict), "SDC--"}};
+    std::vector<std::size_t> order{0, 1, 2};
+    do {
+        MakeSandbox();
+        Answer("/out", ScriptedAnswer::Hold());
+        for (int i = 0; i < 3; ++i) {
+            SandboxTest::Update();
+        }
+        const auto ids = RequestsFor("/out");
+        ASSERT_EQ(ids.size(), 3u);
+        std::size_t newest = 0;
+        for (const std::size_t next : order) {
+            net->Release(ids[next], updates[next].answer);
+            Settle();
+            newest = std::max(newest, next);
+            EXPECT_EQ(State(), updates[newest].state) << order[0] << order[1] << order[2];
+        }
+    } while (std::next_permutation(order.begin(), order.end()));
 }
 
 TEST_F(SandboxTest, ASandboxThatIsClosedMeanwhileIsNotTouched) {
