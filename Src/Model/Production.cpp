@@ -70,7 +70,21 @@ int Production::QueryInterfaceNoAddRef(const RFL::InterfaceID& inID, void** outI
     return Implements::QueryInterfaceNoAddRef(inID, outInterface);
 }
 
+/// A body that comes anew must not take away what the host has set and not stored yet.
+void Production::ApplyPropertyChanges() {
+    ScopedLock lock(IZOCDataServer::GetLock(), "Production::ApplyPropertyChanges");
+    if (!mLoaded || mPropertyChanges.empty()) {
+        return;
+    }
+    dto::ProductionBaseProperties properties = mBody.Properties();
+    for (const auto& change : mPropertyChanges) {
+        properties.Set(change.first, change.second);
+    }
+    mBody.SetProperties(properties);
+}
+
 void Production::PostLoadDTO() {
+    ApplyPropertyChanges();
     const ImmutableString enclosuresLink = GetLinkHref(kRelation_Enclosures);
     const ImmutableString assetsLink = GetAssetsLink();
     if (enclosuresLink.empty() || assetsLink.empty()) {
@@ -135,7 +149,7 @@ void Production::SetProperty(std::string_view inKey, const UString& inValue, con
     if (properties.Text(inKey) != value) {
         properties.Set(inKey, value);
         mBody.SetProperties(properties);
-        mPropertiesChanged = true;
+        mPropertyChanges[std::string(inKey)] = value;
     }
 }
 

@@ -1,6 +1,8 @@
 // A production, an editing session or a transaction: one class, whose role its links tell.
 #pragma once
 
+#include <map>
+
 #include "dto/Production.h"
 #include "JSONServerResource.h"
 #include "Resources/Implements.h"
@@ -112,12 +114,8 @@ protected:
     std::string GetTraceName() override;
 
 private:
-    /// A name or description that was set here and is not stored yet.
-    struct PropertyChanges {
-        bool areThere = false;
-        UString name;
-        UString description;
-    };
+    /// What was set here and is not stored yet, by key.
+    using PropertyChanges = std::map<std::string, std::string, std::less<>>;
 
     bool HasLink(const ImmutableString& inRelation);
     ImmutableString GetAssetsLink();
@@ -145,11 +143,13 @@ private:
     void ClearCachedState();
     void LeaveListOfParent();
     PropertyChanges TakePropertyChanges();
-    void PutBackPropertyChanges();
+    /// Those that were set anew meanwhile stay as they are.
+    void PutBackPropertyChanges(const PropertyChanges& inChanges);
+    void ApplyPropertyChanges();
 
     InterfaceRef<AssetList> mAssets ZO_GUARDED_BY(IZOCDataServer::GetLock());
     InterfaceRef<Enclosures> mEnclosures ZO_GUARDED_BY(IZOCDataServer::GetLock());
-    bool mPropertiesChanged ZO_GUARDED_BY(IZOCDataServer::GetLock()) = false;
+    PropertyChanges mPropertyChanges ZO_GUARDED_BY(IZOCDataServer::GetLock());
     InterfaceRef<TransactionList> mTransactionFactory ZO_GUARDED_BY(IZOCDataServer::GetLock());
     InterfaceRef<TransactionList> mTransactions ZO_GUARDED_BY(IZOCDataServer::GetLock());
     InterfaceRef<Production> mParent ZO_GUARDED_BY(IZOCDataServer::GetLock());

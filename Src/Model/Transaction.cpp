@@ -174,7 +174,6 @@ void Production::ClearCachedState() {
         ScopedLock lock(IZOCDataServer::GetLock(), "Production::ClearCachedState");
         std::swap(mAssets, assets);
         std::swap(mEnclosures, enclosures);
-        mPropertiesChanged = false;
     }
     if (assets) {
         assets->InvalidateContent();
@@ -194,31 +193,32 @@ bool Production::Rollback(const Guid& inRequestID, const RequestCompletion& inCo
                                                    const shared_ptr<ostnet::Response>& inResponse) {
         if (inResult >= 0) {
             self->LeaveListOfParent();
+        } else {
+            // It is still there, and so are its lists.
+            self->PostLoadDTO();
         }
         if (inCompletion) {
             inCompletion(inID, inResult, self, inResponse);
         }
     };
-    return PostJSON(link, GetServer(), JSONValue::EmptyObject(), inRequestID,
-                    TreatMissingAsGone(onRolledBack));
+    const bool started =
+        PostJSON(link, GetServer(), JSONValue::EmptyObject(), inRequestID, TreatMissingAsGone(onRolledBack));
+    if (!started) {
+        PostLoadDTO();
+    }
+    return started;
 }
 
 Production::PropertyChanges Production::TakePropertyChanges() {
     PropertyChanges changes;
     ScopedLock lock(IZOCDataServer::GetLock(), "Production::StoreProductionChangesInTransaction()");
-    changes.areThere = mPropertiesChanged;
-    if (mPropertiesChanged) {
-        mPropertiesChanged = false;
-        const auto properties = mBody.Properties();
-        changes.name = ostcore::utility::ToUTF16(properties.Name());
-        changes.description = ostcore::utility::ToUTF16(properties.Description());
-    }
+    changes.swap(mPropertyChanges);
     return changes;
 }
 
-void Production::PutBackPropertyChanges() {
+void Production::PutBackPropertyChanges(const PropertyChanges& inChanges) {
     ScopedLock lock(IZOCDataServer::GetLock(), "Production::PutBackPropertyChanges");
-    mPropertiesChanged = true;
+    mPropertyChanges.insert(inChanges.begin(), inChanges.end());
 }
 
 bool Production::StoreProductionChangesInTransaction(const InterfaceRef<IZOCTransaction>& inTransaction,
@@ -228,7 +228,7 @@ bool Production::StoreProductionChangesInTransaction(const InterfaceRef<IZOCTran
         return false;
     }
     const PropertyChanges changes = TakePropertyChanges();
-    if (!changes.areThere) {
+    if (changes.empty()) {
         return transaction->GetServer()->PostFunction(
             [inCompletion] {
                 if (inCompletion) {
@@ -237,14 +237,14 @@ bool Production::StoreProductionChangesInTransaction(const InterfaceRef<IZOCTran
             },
             0);
     }
-    transaction->SetName(changes.name);
-    transaction->SetDescription(changes.description);
+    transaction->SetName(GetName());
+    transaction->SetDescription(GetDescription());
     const InterfaceRef<Production> self(this);
-    const auto onStored = [self, transaction, inCompletion](const Guid&, int inResult,
-                                                            const InterfaceRef<IZOCServerResource>&,
-                                                            const shared_ptr<ostnet::Response>&) {
+    const auto onStored = [self, transaction, changes, inCompletion](const Guid&, int inResult,
+                                                                     const InterfaceRef<IZOCServerResource>&,
+                                                                     const shared_ptr<ostnet::Response>&) {
         if (inResult < 0) {
-            self->PutBackPropertyChanges();
+            self->PutBackPropertyChanges(changes);
         } else {
             transaction->TakePropertyChanges();
         }
@@ -255,7 +255,7 @@ bool Production::StoreProductionChangesInTransaction(const InterfaceRef<IZOCTran
     if (transaction->UpdateProductionBaseProperties(Guid::CreateUnique(), onStored)) {
         return true;
     }
-    PutBackPropertyChanges();
+    PutBackPropertyChanges(changes);
     return false;
 }
 

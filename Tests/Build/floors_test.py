@@ -62,7 +62,7 @@ def main():
         for line in path.read_text().splitlines():
             if re.match(r'\s*#\s*include\s+"\.\./', line):
                 failures.append(f"{path.relative_to(source)} climbs out of its folder: {line.strip()}")
-    hub = re.compile(r'#\s*include\s+[<"](ZOClient|ostcore|ostnet|RFL|zourl|HLM|ostmediatypes)/')
+    hub = re.compile(r'#\s*include\s+[<"](ZOClient|ostcore|ostnet|RFL|zourl|HLM|ostmediatypes|ostnetsync|ostui)/')
     for path in (source / "Hub").rglob("*.[hc]*"):
         if hub.search(path.read_text()):
             failures.append(f"{path.relative_to(source)} shares code with the client")
