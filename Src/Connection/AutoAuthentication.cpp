@@ -132,7 +132,13 @@ void HandleFirstAutoAuthentication() {
     {
         Watch& watch = TheWatch();
         MutexLock lock(watch.mutex);
-        watch.notifier.swap(notifier);
+        if (watch.isOn) {
+            watch.notifier.swap(notifier);
+        }
+    }
+    if (notifier) {
+        // Stopped meanwhile.
+        notifier->Stop();
     }
     ostcore::threads::AsyncCallFromMainThread(onChanged);
 }

@@ -1,6 +1,8 @@
 // The progress window: a text, a bar and up to two buttons around a running operation.
 #include "Frame/ProgressWindow.h"
 
+#include <algorithm>
+
 #include "ostcore/config/ZString.h"
 #include "ostcore/threads/MainThread.h"
 #include "ostcore/utility/StringConversion.h"

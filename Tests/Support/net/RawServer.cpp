@@ -27,6 +27,8 @@ namespace net {
 namespace {
 
 constexpr std::chrono::seconds kPatience(30);
+/// What a stated length may reserve before its bytes are there.
+constexpr std::size_t kLargestReservation = std::size_t(64) << 20;
 
 std::string Lower(std::string_view inText) {
     std::string text(inText);
@@ -145,13 +147,17 @@ std::optional<ReceivedRequest> Connection::ReadRequest() {
     }
     const auto length = request->Header("Content-Length");
     const std::size_t size = length ? std::stoul(*length) : 0;
+    mBuffer.reserve(std::min(size, kLargestReservation));
     while (mBuffer.size() < size) {
         if (!Fill()) {
             return std::nullopt;
         }
     }
-    request->body = mBuffer.substr(0, size);
-    mBuffer.erase(0, size);
+    // A large body is most often all that there is.
+    std::string rest = mBuffer.substr(size);
+    mBuffer.resize(size);
+    request->body = std::move(mBuffer);
+    mBuffer = std::move(rest);
     mServer.Keep(*request);
     return request;
 }
