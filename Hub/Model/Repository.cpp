@@ -50,8 +50,17 @@ bool Repository::HasCommit(LineRecord const& inLine, CommitRecord const& inCommi
 }
 
 View Repository::LiveView(LineRecord inLine, Actor const& inActor) {
+    auto commit = mTransaction.FindCommit(inLine.headCommit);
+    if (!commit)
+        throw std::runtime_error("the commit " + inLine.headCommit + " is missing; run zohub check");
+    return ViewAt(std::move(inLine), std::move(*commit), inActor);
+}
+
+View Repository::ViewAt(LineRecord inLine, CommitRecord inCommit, Actor const& inActor) {
     View view;
     view.line = std::move(inLine);
+    view.commit = std::move(inCommit);
+    view.tree = LoadTree(view.commit.tree);
     bool const isOwner = view.line.owner == inActor.name;
     if (view.IsSession())
         view.mayManage = isOwner;
@@ -59,11 +68,6 @@ View Repository::LiveView(LineRecord inLine, Actor const& inActor) {
         view.mayWrite = isOwner && !view.line.isEnded;
     else
         view.mayWrite = view.line.kind != kLineTemplate || isOwner || inActor.isAdmin;
-    auto commit = mTransaction.FindCommit(view.line.headCommit);
-    if (!commit)
-        throw std::runtime_error("the commit " + view.line.headCommit + " is missing; run zohub check");
-    view.commit = std::move(*commit);
-    view.tree = LoadTree(view.commit.tree);
     return view;
 }
 
@@ -71,15 +75,13 @@ View Repository::Open(std::string const& inLineId, std::string const& inCommit, 
     auto line = mTransaction.FindLine(inLineId);
     if (!line || !MayRead(*line, inActor))
         FailNotFound("The production");
-    View view = LiveView(std::move(*line), inActor);
     if (IsHead(inCommit))
-        return view;
+        return LiveView(std::move(*line), inActor);
     auto commit = mTransaction.FindCommit(inCommit);
-    if (!commit || !HasCommit(view.line, *commit))
+    if (!commit || !HasCommit(*line, *commit))
         FailNotFound("The commit of the production");
+    View view = ViewAt(std::move(*line), std::move(*commit), inActor);
     view.isPinned = true;
-    view.commit = std::move(*commit);
-    view.tree = LoadTree(view.commit.tree);
     return view;
 }
 

@@ -85,6 +85,7 @@ public:
                     Actor const& inCommitter, Micros inNow);
 
 private:
+    View ViewAt(LineRecord inLine, CommitRecord inCommit, Actor const& inActor);
     CommitRecord WriteCommit(LineRecord const& inLine, TreeRoot const& inTree, std::string const& inTitle,
                              Actor const& inCommitter, Micros inNow);
 

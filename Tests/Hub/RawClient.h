@@ -53,7 +53,8 @@ private:
 /// A user with his token: one request per connection, JSON or bytes.
 class Client {
 public:
-    explicit Client(std::uint16_t inPort) : mPort(inPort) {}
+    explicit Client(std::uint16_t inPort, std::string inToken = {})
+        : mPort(inPort), mToken(std::move(inToken)) {}
 
     using Headers = std::map<std::string, std::string>;
     /// The target is a path or an absolute URL of this server.

@@ -80,6 +80,27 @@ TEST_F(SessionTest, DoesNotExistForAnybodyButItsOwner) {
     EXPECT_EQ(Json::parse(root.Get(shared + "/sessions").body)["sessions"].size(), 1u);
 }
 
+TEST_F(SessionTest, StandsOnlyOnWhatItsOwnerMayWriteTo) {
+    {
+        auto const transaction = mHub.Data().BeginWrite();
+        TreeRoot tree;
+        tree.properties = R"({"name":"Series","description":""})";
+        Repository(*transaction).CreateLine(kLineTemplate, tree, "made", {"ben", false}, false, 1);
+        transaction->Commit();
+    }
+    Json const list = Json::parse(mAnna.Get("/zo/1/templates").body);
+    Json const seen = Load(mAnna, list["productions"][0]);
+    EXPECT_FALSE(HasLink(seen, "/sessions"));
+    std::string const sessions = LinkOf(seen, "self") + "/sessions";
+    EXPECT_FALSE(HasLink(Json::parse(mAnna.Get(sessions).body), "create"));
+    EXPECT_EQ(mAnna.PostJson(sessions, "{}").status, 403);
+    Client const ben = mHub.SignedIn("ben");
+    Json const session = MakeSession(ben, Load(ben, seen));
+    EXPECT_EQ(ben.PostJson(LinkOf(session, "self") + "/sessions", "{}").status, 404) << "not on a session";
+    EXPECT_EQ(ben.PostJson(LinkOf(seen, "self") + "/transactions", "{}").status, 404);
+    EXPECT_EQ(ben.PostJson(LinkOf(seen, "self") + "/commit", "{}").status, 404);
+}
+
 TEST_F(SessionTest, IsWrittenThroughATransactionAndOnlyThere) {
     Json const production = MakeSharedProduction();
     AddAsset(mAnna, production, "a", "shared");
