@@ -31,6 +31,24 @@ bool PostJSON(const ImmutableString& inURL, const InterfaceRef<IZOCDataServer>& 
                         inRequestID, inCompletion);
 }
 
+bool HasBody(const shared_ptr<ostnet::Response>& inResponse) {
+    return inResponse && inResponse->payload && !inResponse->payload->empty();
+}
+
+/// The session as the answer to a commit tells it, for a transaction whose session nobody holds; null when it
+/// does not.
+InterfaceRef<Production> ReadSession(const ImmutableString& inURL,
+                                     const InterfaceRef<IZOCDataServer>& inServer,
+                                     const shared_ptr<ostnet::Response>& inResponse) {
+    if (!HasBody(inResponse)) {
+        return nullptr;
+    }
+    const InterfaceRef<Production> session(new Production);
+    const bool isRead =
+        session->InternalInit(inURL, inServer, inResponse, ResourceWritability::kWritable, true);
+    return isRead ? session : nullptr;
+}
+
 }  // namespace
 
 ImmutableString Production::GetAssetFactoryURL() {
@@ -135,11 +153,15 @@ void Production::OnCommitted(const Guid& inRequestID, int inResult,
     if (!session) {
         session = RFL::QueryInterface<Production>(FindCachedProduction(GetServer(), GetParentLink()));
     }
+    const bool isHeld = bool(session);
+    if (inResult >= 0 && !isHeld) {
+        session = ReadSession(GetParentLink(), GetServer(), inResponse);
+    }
     const auto complete = [inRequestID, inResult, inResponse, inCompletion, session](
                               const Guid&, int, const InterfaceRef<IZOCServerResource>&,
                               const shared_ptr<ostnet::Response>&) {
         // A refresh that failed leaves nothing behind; the answer to the commit tells the same.
-        if (inResult >= 0 && session && !session->IsLoaded()) {
+        if (inResult >= 0 && session && !session->IsLoaded() && HasBody(inResponse)) {
             session->InitFromResponse(inResponse, ResourceWritability::kKeep);
         }
         if (inCompletion) {
@@ -148,7 +170,7 @@ void Production::OnCommitted(const Guid& inRequestID, int inResult,
     };
     if (inResult >= 0) {
         LeaveListOfParent();
-        if (session && session->Refresh(Guid::CreateUnique(), complete)) {
+        if (isHeld && session->Refresh(Guid::CreateUnique(), complete)) {
             return;
         }
     }

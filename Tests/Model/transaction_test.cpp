@@ -165,6 +165,24 @@ TEST_F(TransactionTest, AnIngestIsRebasedAndAFailedCommitStaysPending) {
     EXPECT_FALSE(MakeSession()->Commit(Guid::CreateUnique(), RequestCompletion(), u""));
 }
 
+TEST_F(TransactionTest, WhoHoldsNoSessionGetsTheOneThatTheAnswerTells) {
+    const auto transaction = MakeTransaction();
+    On("POST /t1/commit", JSONAnswer(SessionBody("c6")));
+    Outcome outcome;
+    ASSERT_TRUE(transaction->Commit(Guid::CreateUnique(), outcome.Function(), u""));
+    EXPECT_EQ(outcome.Wait(), kResultSuccess);
+    const auto session = RFL::QueryInterface<IZOCProduction>(outcome.Resource());
+    ASSERT_TRUE(session);
+    EXPECT_TRUE(session->IsEditingSession());
+    EXPECT_EQ(session->GetLoadedRevision().view(), "c6");
+    EXPECT_EQ(Requests(), 1u);
+    On("POST /t1/commit", ScriptedAnswer::Status(204));
+    Outcome bare;
+    ASSERT_TRUE(transaction->Commit(Guid::CreateUnique(), bare.Function(), u""));
+    EXPECT_EQ(bare.Wait(), kResultSuccess);
+    EXPECT_FALSE(bare.Resource());
+}
+
 TEST_F(TransactionTest, RollbackDropsWhatIsHeldAndOneThatIsGoneIsNoFailure) {
     for (const auto& [status, result] :
          {std::pair(204, kResultSuccess), std::pair(404, kResultGone), std::pair(409, kResultHTTPConflict)}) {
