@@ -6,6 +6,7 @@
 #include "Failure.h"
 #include "HLM/HLM.h"
 #include "ostcore/config/ClientInfo.h"
+#include "ostcore/debug/Trace.h"
 #include "ostui/TerminalBackEnd.h"
 #include "RFL/Registry.h"
 #include "ServerAddress.h"
@@ -35,6 +36,10 @@ Library::Library(MainLoop& inLoop) : mLoop(inLoop) {
     HLM::SetIsHeadless(true);
     // A login that is lost ends the verb's own requests, and with them the verb, by its exit code.
     HLM::SetEndProcessFunction([] {});
+    // What the library calls fatal is told by the verb in its own words. Who wants traces has asked for them.
+    if (!ostcore::debug::TraceEnabled("zo", ostcore::debug::kTraceLevel_Error)) {
+        ostcore::debug::SetTraceLevel("*", ostcore::debug::kTraceLevel_Off);
+    }
     ostcore::config::SetClientName("zo");
     ostcore::config::SetClientBuildNumber(ZO_VERSION);
     ZOCL::Initialize();
