@@ -17,8 +17,9 @@ class Documents(EndToEndTest):
 
     def test_every_verb_is_there_with_help_examples_and_exit_codes(self):
         self.assertEqual([verb["name"] for verb in self.table],
-                         ["hub", "login", "logout", "whoami", "productions", "open", "show", "assets", "get", "help",
-                          "version", "completion", "man"])
+                         ["hub", "login", "logout", "whoami", "productions", "open", "show", "assets", "get", "session",
+                          "status", "add", "set", "put", "rm", "xmp", "commit", "rollback", "pending", "share", "latest",
+                          "conflicts", "resolve", "diff", "history", "watch", "help", "version", "completion", "man"])
         overview = self.ends(self.ada.zo("help"), OK).text
         for verb in self.table:
             self.assertIn("\n  " + verb["name"], overview)
@@ -90,7 +91,8 @@ class Documents(EndToEndTest):
             for option in verb["options"]:
                 self.assertIn("`--" + option["name"], reference)
         for kind in ("hub", "login", "logout", "user", "production", "open", "asset", "file", "command", "version",
-                     "completion", "man", "error", "progress"):
+                     "completion", "man", "error", "progress", "session", "status", "added", "set", "put", "removed", "xmp",
+                     "transaction", "pending", "share", "latest", "conflict", "difference", "change"):
             self.assertIn(f"`{kind}`", reference)
 
 

@@ -1,6 +1,7 @@
 #!/usr/bin/env bash
 # The walk through the whole: a hub in a directory of its own, a folder of real media imported as a
-# production, and a user who signs in, opens it, reads everything back and follows it to a newer commit.
+# production, and a user who signs in, opens it, reads everything back and follows it to a newer commit. Then two
+# users work on it, each in a session: they change, share, get the latest and decide a conflict.
 #
 # usage: demo.sh BUILD_DIRECTORY (or the directory that holds zo and zohub)
 set -euo pipefail
@@ -143,8 +144,75 @@ files=$(find "$work/got-tls" -type f | wc -l)
 [[ "$files" -eq "$compared" ]] || fail "$files of $compared files came over TLS"
 echo "$files files came over TLS"
 
-tell "Signing out, and a look at the hub's books"
+tell "Signing out"
 run "$zo" logout
+
+tell "Two users, each with a session of their own"
+ada() { as ada "$@"; }
+ben() { as ben "$@"; }
+# A user is a state directory and a login; the command line is shown as that user would type it.
+as() {
+  local who="$1"
+  shift
+  printf '%s%s$ zo %s%s\n' "$bold" "$who" "$*" "$plain" >&2
+  ZOCLIENT_CONFIG_HOME="$work/$who/config" ZOCLIENT_STATE_HOME="$work/$who/state" "$zo" "$@"
+}
+# Runs a command that has to end with a certain exit code.
+ends_with() {
+  local wanted="$1" code=0
+  shift
+  "$@" || code=$?
+  [[ $code -eq $wanted ]] || fail "'$*' ended with code $code instead of $wanted"
+}
+stop_hub
+(umask 077 && head -c 24 /dev/urandom | base64 >"$work/ben-password")
+run "$zohub" user add ben --data "$work/hub" --password-file "$work/ben-password"
+run "$zohub" import "$work/media" --data "$work/hub" --production "Harbour Film" --owner ada --grant ben
+start_hub
+ada login --server "$http_url" --user ada --password-file "$work/password"
+ben login --server "$http_url" --user ben --password-file "$work/ben-password"
+ada open "Harbour Film"
+ben open "Harbour Film"
+
+tell "Ada adds a new take with its sidecar and changes a name; nobody sees it before she shares it"
+mkdir "$work/day2"
+cp "$work/media/broll/lighthouse.jpg" "$work/day2/lighthouse-night.jpg"
+cp "$work/media/broll/lighthouse.xmp" "$work/day2/lighthouse-night.xmp"
+ada add --name "Day 2" --type bin
+ada add "$work/day2/lighthouse-night.jpg" --parent "Day 2" -m "The lighthouse at night"
+ada set --asset gulls.jpg "name=Gulls at dawn"
+ada status
+ben assets --json | grep -q lighthouse-night && fail "Ben sees what Ada has not shared"
+ben set --asset gulls.jpg "name=Gulls, loud"
+ben xmp set harbour-wide.mp4 "$work/media/broll/gulls.xmp"
+ada share -m "Night takes"
+
+tell "Ben has changed the same name meanwhile, and cannot share before he has got the latest"
+ends_with 4 ben share -m "My changes"
+ben latest --dry-run
+ends_with 3 ben latest
+ends_with 3 ben conflicts
+ben resolve --theirs --all
+ben share -m "New metadata of the wide shot"
+
+tell "What Ada sent is on Ben's side, byte for byte, and the other way round"
+ben get lighthouse-night.jpg --output "$work/ben-got/"
+cmp "$work/day2/lighthouse-night.jpg" "$work/ben-got/lighthouse-night.jpg" || fail "the picture is another one"
+cmp "$work/day2/lighthouse-night.xmp" "$work/ben-got/lighthouse-night.jpg.xmp" || fail "the sidecar is another one"
+ada latest
+ada xmp get harbour-wide.mp4 --output "$work/ada-got.xmp"
+cmp "$work/media/broll/gulls.xmp" "$work/ada-got.xmp" || fail "the metadata are others"
+ada history --shared
+ada history --count 3
+
+tell "A transaction over two changes, and the way back"
+ada set --asset slate.png "description=Scene 4" --keep-open
+ada rm room-tone.wav
+ada pending
+ada rollback
+ada status
+
+tell "A look at the hub's books"
 stop_hub
 run "$zohub" check --data "$work/hub"
 

@@ -218,7 +218,8 @@ private:
             CheckChoice(argument.name, mResult.mPositionals[index], argument.completes, argument.choices,
                         &inCommand);
         }
-        if (mResult.mPositionals.size() > inCommand.arguments.size()) {
+        const bool repeats = !inCommand.arguments.empty() && inCommand.arguments.back().repeats;
+        if (!repeats && mResult.mPositionals.size() > inCommand.arguments.size()) {
             throw UsageError("'" + mResult.mPositionals[inCommand.arguments.size()] +
                                  "' is one argument too many for 'zo " + inCommand.name + "'",
                              &inCommand);
@@ -246,6 +247,12 @@ std::string Arguments::ValueOr(const std::string& inOption, const std::string& i
 
 std::optional<std::string> Arguments::Positional(std::size_t inIndex) const {
     return inIndex < mPositionals.size() ? std::optional(mPositionals[inIndex]) : std::nullopt;
+}
+
+std::vector<std::string> Arguments::PositionalsFrom(std::size_t inIndex) const {
+    const auto begin =
+        mPositionals.begin() + static_cast<std::ptrdiff_t>(std::min(inIndex, mPositionals.size()));
+    return {begin, mPositionals.end()};
 }
 
 bool AsksForJson(const std::vector<std::string>& inWords) {

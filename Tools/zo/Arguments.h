@@ -22,6 +22,8 @@ public:
     std::string ValueOr(const std::string& inOption, const std::string& inDefault) const;
     /// By position; nothing when it was left out.
     std::optional<std::string> Positional(std::size_t inIndex) const;
+    /// All from a position on.
+    std::vector<std::string> PositionalsFrom(std::size_t inIndex) const;
 
 private:
     friend class ArgumentsReader;

@@ -116,6 +116,27 @@ const AssetItem& FindAsset(const std::vector<AssetItem>& inItems, const std::str
     return *found;
 }
 
+NamedAsset LoadNamedAsset(Context& ioContext, const LoadedProduction& inProduction,
+                          const std::string& inWhich) {
+    const auto list = LoadAssetList(ioContext, inProduction);
+    const std::vector<AssetItem> items = list->GetAllItems();
+    NamedAsset named;
+    named.item = FindAsset(items, inWhich, inProduction.name);
+    named.asset = list->GetAssetByIdentifier(named.item.assetIdentifier);
+    named.name = ToUTF8(named.item.name);
+    if (!named.asset) {
+        throw Failure(ExitCode::Failure, "reading the asset " + named.name + ": the list does not hold it",
+                      "run the command again");
+    }
+    return named;
+}
+
+std::string XMPEnclosureOf(const AssetItem& inItem) {
+    return inItem.mediaLocatorIdentifier.empty()
+               ? std::string()
+               : ZOCL::GetXMPEnclosureName(inItem.mediaLocatorIdentifier).str();
+}
+
 std::vector<AssetDetails> LoadDetails(Context& ioContext, const InterfaceRef<ZOCL::IZOCAssetList>& inList,
                                       const std::vector<AssetItem>& inItems, Locators inLocators) {
     const auto server = ioContext.Server();

@@ -18,6 +18,15 @@ ZOCL::InterfaceRef<ZOCL::IZOCAssetList> LoadAssetList(Context& ioContext,
 const AssetItem& FindAsset(const std::vector<AssetItem>& inItems, const std::string& inWhich,
                            const std::string& inProduction);
 
+/// One asset of a production, session or transaction, by identifier or exact name.
+struct NamedAsset {
+    AssetItem item;
+    ZOCL::InterfaceRef<ZOCL::IZOCAsset> asset;
+    std::string name;
+};
+NamedAsset LoadNamedAsset(Context& ioContext, const LoadedProduction& inProduction,
+                          const std::string& inWhich);
+
 /// One asset with all that hangs on it, loaded.
 struct AssetDetails {
     AssetItem item;
@@ -49,6 +58,9 @@ struct RenditionText {
     std::string contentID;
 };
 std::vector<RenditionText> RenditionsOf(const ZOCL::InterfaceRef<ZOCL::IZOCRenditions>& inRenditions);
+
+/// The name of the enclosure that holds an asset's XMP packet; empty for an asset without a media locator.
+std::string XMPEnclosureOf(const AssetItem& inItem);
 
 /// The JSON object of an asset: what the list says, and with details the rest.
 Json AssetJson(const AssetItem& inItem);

@@ -9,6 +9,8 @@ namespace zo {
 namespace {
 
 const Option kDryRun{"dry-run", 'n', "", "Tell what would be done and do nothing."};
+const Option kShared{"shared", 0, "",
+                     "Read the shared production at the open commit, also when a session is in use."};
 const Option kForce{"force", 'f', "", "Replace files that exist already."};
 
 const std::vector<ExitCode> kOfRequests{ExitCode::NotAuthenticated, ExitCode::NotPermitted,
@@ -107,7 +109,8 @@ Command Open() {
         "open",
         "open a production at a commit",
         "Loads a production and remembers it, with its commit, as the open production of this user; show, "
-        "assets and get then work on exactly this commit until another one is opened. PRODUCTION is a name, "
+        "assets and get then work on exactly this commit until another one is opened, or until the first "
+        "change or 'zo session show' brings the user's own session into use. PRODUCTION is a name, "
         "an identifier or a URL; without it the open production is meant. --latest goes on to the newest "
         "commit by the production's own latest-version link.",
         {{"PRODUCTION", "Name, identifier or URL; the open production when it is left out."}},
@@ -130,7 +133,7 @@ Command Show() {
         "commit exists, enclosures and how many assets of which type. With --asset it shows one asset with "
         "its locator, enclosures and renditions.",
         {{"PRODUCTION", "Name, identifier or URL; the open production when it is left out."}},
-        {{"asset", 'a', "ASSET", "Show this asset, by name or identifier."}},
+        {{"asset", 'a', "ASSET", "Show this asset, by name or identifier."}, kShared},
         true,
         {{"zo show", "The open production."}, {"zo show --asset clip01", "One asset of it."}},
         kOfRequests,
@@ -152,7 +155,8 @@ Command Assets() {
           {"bin", "smartbin", "masterclip", "subclip", "sequence", "synthetic", "synthetic-sf",
            "composition"}},
          {"parent", 'p', "ASSET", "Only assets directly in this bin, by name or identifier."},
-         {"long", 'l', "", "Add locators, enclosures and renditions."}},
+         {"long", 'l', "", "Add locators, enclosures and renditions."},
+         kShared},
         true,
         {{"zo assets --type masterclip --long", "All clips with everything known of them."},
          {"zo assets --json", "One JSON object an asset."}},
@@ -181,6 +185,7 @@ Command Get() {
          {"output", 'o', "PATH",
           "A file, a folder (existing, or with a slash at its end), or - for standard output.",
           Completes::Files},
+         kShared,
          kForce,
          kDryRun},
         true,
@@ -247,16 +252,21 @@ Command Man() {
 const char* const kToolSummary = "work with productions on a collaboration hub";
 const char* const kToolDescription =
     "zo signs in to a hub, lists and opens productions, shows their assets and fetches their payloads. It "
-    "opens "
-    "productions at a commit, so that what a script reads does not move under it. Every verb takes --json "
-    "and "
-    "then writes one JSON object a line on standard output; errors and progress are JSON lines on standard "
-    "error.";
+    "opens productions at a commit, so that what a script reads does not move under it. Changes go into the "
+    "user's own session, each in a transaction that is committed or rolled back; the session is shared with "
+    "others, and gets their latest commits, by one verb each. Every verb takes --json and then writes one "
+    "JSON object a line on standard output; errors and progress are JSON lines on standard error.";
 
 const std::vector<Command>& AllCommands() {
-    static const std::vector<Command> table{Hub(),     Login(),      Logout(), WhoAmI(), Productions(),
-                                            Open(),    Show(),       Assets(), Get(),    Help(),
-                                            Version(), Completion(), Man()};
+    static const std::vector<Command> table = [] {
+        std::vector<Command> all{Hub(),  Login(), Logout(), WhoAmI(), Productions(),
+                                 Open(), Show(),  Assets(), Get()};
+        for (const auto& commands :
+             {WorkCommands(), std::vector<Command>{Help(), Version(), Completion(), Man()}}) {
+            all.insert(all.end(), commands.begin(), commands.end());
+        }
+        return all;
+    }();
     return table;
 }
 

@@ -34,6 +34,8 @@ struct Argument {
     bool required = false;
     Completes completes = Completes::Nothing;
     std::vector<std::string> choices = {};
+    /// The last argument may stand for any number of words.
+    bool repeats = false;
 };
 
 struct Example {
@@ -56,6 +58,8 @@ struct Command {
 };
 
 const std::vector<Command>& AllCommands();
+/// The part of the table with which a user works in a session: writing, sharing, getting, looking.
+std::vector<Command> WorkCommands();
 /// Null when there is no such verb.
 const Command* FindCommand(const std::string& inName);
 /// Options that every verb takes.

@@ -180,8 +180,12 @@ std::string ZshCompletion() {
             text += ZshOption(option);
         }
         for (const Argument& argument : command.arguments) {
-            text += std::string("        '") + (argument.required ? ":" : "::") + ZshEscaped(argument.name) +
-                    ":" + ZshAction(argument.completes, argument.choices) + "' \\\n";
+            text += std::string("        '") +
+                    (argument.repeats    ? "*:"
+                     : argument.required ? ":"
+                                         : "::") +
+                    ZshEscaped(argument.name) + ":" + ZshAction(argument.completes, argument.choices) +
+                    "' \\\n";
         }
         text += "        && return\n      ;;\n";
     }

@@ -62,7 +62,8 @@ std::string OptionRows(const std::vector<Option>& inOptions) {
 std::string SynopsisOf(const Command& inCommand) {
     std::string text = "zo " + inCommand.name + " [OPTIONS]";
     for (const Argument& argument : inCommand.arguments) {
-        text += argument.required ? " " + argument.name : " [" + argument.name + "]";
+        const std::string name = argument.name + (argument.repeats ? "..." : "");
+        text += argument.required ? " " + name : " [" + name + "]";
     }
     return text;
 }

@@ -1,6 +1,7 @@
 // Brings completions to the main thread and waits for them.
 #include "MainLoop.h"
 
+#include <algorithm>
 #include <memory>
 
 #include "Failure.h"
@@ -10,6 +11,7 @@ namespace zo {
 namespace {
 
 constexpr std::uint32_t kForEver = 0xFFFFFFFFu;
+constexpr std::int64_t kLongestTurn = 60000;
 
 }  // namespace
 
@@ -21,6 +23,10 @@ void MainLoop::Start(const StartFunction& inStart, const CancelFunction& inCance
         inDone(cancelled);
         return;
     }
+    Launch(inStart, inCancel, std::move(inDone));
+}
+
+void MainLoop::Launch(const StartFunction& inStart, const CancelFunction& inCancel, OutcomeFunction inDone) {
     const ZOCL::Guid request = ZOCL::Guid::CreateUnique();
     const std::size_t call = Add(request, inCancel);
     const auto done = std::make_shared<OutcomeFunction>(std::move(inDone));
@@ -50,6 +56,29 @@ Outcome MainLoop::Run(const StartFunction& inStart, const CancelFunction& inCanc
     Start(inStart, inCancel, [&outcome](const Outcome& inOutcome) { outcome = inOutcome; });
     Wait();
     return outcome;
+}
+
+Outcome MainLoop::RunToEnd(const StartFunction& inStart) {
+    Outcome outcome;
+    Launch(
+        inStart, [](const ZOCL::Guid&) {}, [&outcome](const Outcome& inOutcome) { outcome = inOutcome; });
+    PumpUntilIdle();
+    return outcome;
+}
+
+bool MainLoop::WaitUntil(const std::function<bool()>& inCondition, std::chrono::milliseconds inTime) {
+    const auto end = std::chrono::steady_clock::now() + inTime;
+    while (!inCondition()) {
+        ThrowIfInterrupted();
+        const auto left =
+            std::chrono::ceil<std::chrono::milliseconds>(end - std::chrono::steady_clock::now());
+        if (left.count() <= 0) {
+            return false;
+        }
+        ostcore::threads::WaitAndPumpMainThread(
+            static_cast<std::uint32_t>(std::min<std::int64_t>(left.count(), kLongestTurn)));
+    }
+    return true;
 }
 
 MainLoop::ConnectOutcome MainLoop::Connect(const ConnectStart& inStart) {

@@ -1,6 +1,7 @@
 // Waits on the main thread for asynchronous calls of the library, and cancels them on Ctrl-C.
 #pragma once
 
+#include <chrono>
 #include <functional>
 #include <map>
 
@@ -41,6 +42,12 @@ public:
     void Wait();
     /// Starts one call and waits for it and for all others in flight.
     Outcome Run(const StartFunction& inStart, const CancelFunction& inCancel);
+    /// The same for a call that must come to its end, such as giving back what was taken: it is started also
+    /// after an interrupt, and is not cancelled by one. Throws nothing.
+    Outcome RunToEnd(const StartFunction& inStart);
+    /// Returns true when the condition holds, false when the time is over. It is asked after each piece of
+    /// work of the main thread. Throws a Failure (cancelled) after an interrupt.
+    bool WaitUntil(const std::function<bool()>& inCondition, std::chrono::milliseconds inTime);
 
     struct ConnectOutcome {
         bool started = false;
@@ -62,6 +69,7 @@ private:
         ZOCL::Guid request;
         CancelFunction cancel;
     };
+    void Launch(const StartFunction& inStart, const CancelFunction& inCancel, OutcomeFunction inDone);
     std::size_t Add(const ZOCL::Guid& inRequest, const CancelFunction& inCancel);
     void CancelAll();
     void PumpUntilIdle();

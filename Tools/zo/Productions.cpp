@@ -30,16 +30,6 @@ bool CouldBeIdentifier(const std::string& inText) {
     });
 }
 
-LoadedProduction Describe(const InterfaceRef<ZOCL::IZOCProduction>& inProduction) {
-    LoadedProduction loaded;
-    loaded.production = inProduction;
-    loaded.id = inProduction->GetIdentifier().str();
-    loaded.name = ToUTF8(inProduction->GetName());
-    loaded.commit = inProduction->GetLoadedRevision().str();
-    loaded.url = RFL::QueryInterface<ZOCL::IZOCServerResource>(inProduction)->GetHTTPURL().str();
-    return loaded;
-}
-
 Failure NoSuchProduction(Context& ioContext, const std::string& inWhich) {
     return Failure(ExitCode::NotFound,
                    "there is no production '" + inWhich + "' at " + ioContext.ConnectedTarget().server +
@@ -86,10 +76,27 @@ LoadedProduction LoadByURL(Context& ioContext, const std::string& inURL) {
                                  outcome.Succeeded() ? ZOCL::kResultFailure : outcome.result,
                                  outcome.response);
     }
-    return Describe(production);
+    return DescribeProduction(production);
 }
 
 }  // namespace
+
+void CheckIsCommit(const std::string& inText) {
+    if (!CouldBeIdentifier(inText)) {
+        throw Failure(ExitCode::Usage, "'" + inText + "' is no commit",
+                      "'zo show' and 'zo history' tell commits");
+    }
+}
+
+LoadedProduction DescribeProduction(const InterfaceRef<ZOCL::IZOCProduction>& inProduction) {
+    LoadedProduction loaded;
+    loaded.production = inProduction;
+    loaded.id = inProduction->GetIdentifier().str();
+    loaded.name = ToUTF8(inProduction->GetName());
+    loaded.commit = inProduction->GetLoadedRevision().str();
+    loaded.url = RFL::QueryInterface<ZOCL::IZOCServerResource>(inProduction)->GetHTTPURL().str();
+    return loaded;
+}
 
 void LoadResource(Context& ioContext, const InterfaceRef<ZOCL::IZOCServerResource>& inResource,
                   const std::string& inWhat) {
@@ -151,15 +158,14 @@ LoadedProduction LoadProduction(Context& ioContext, const std::string& inWhich, 
 }
 
 LoadedProduction LoadProductionAt(Context& ioContext, const std::string& inID, const std::string& inCommit) {
-    if (!inCommit.empty() && !CouldBeIdentifier(inCommit)) {
-        throw Failure(ExitCode::Usage, "'" + inCommit + "' is no commit",
-                      "'zo show' tells the commit of a production");
+    if (!inCommit.empty()) {
+        CheckIsCommit(inCommit);
     }
     const auto production =
         ioContext.Server()->GetProductionByIdAndCommitId(ImmutableString(inID), ImmutableString(inCommit));
     LoadResource(ioContext, production,
                  "loading the production " + inID + (inCommit.empty() ? "" : " at commit " + inCommit));
-    return Describe(production);
+    return DescribeProduction(production);
 }
 
 LoadedProduction LoadOpenProduction(Context& ioContext) {
@@ -179,13 +185,13 @@ LoadedProduction LoadLatestVersion(Context& ioContext, const LoadedProduction& i
         return {};
     }
     LoadResource(ioContext, latest, "loading the latest version of " + inProduction.name);
-    return Describe(latest);
+    return DescribeProduction(latest);
 }
 
 void RememberOpen(Context& ioContext, const LoadedProduction& inProduction) {
     const Target& target = ioContext.ConnectedTarget();
     ioContext.Remembered().SetOpen(
-        {target.server, target.user, inProduction.id, inProduction.name, inProduction.commit});
+        {target.server, target.user, inProduction.id, inProduction.name, inProduction.commit, "", "", ""});
 }
 
 }  // namespace zo

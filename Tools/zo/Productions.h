@@ -31,6 +31,12 @@ struct LoadedProduction {
     std::string url;
 };
 
+/// Throws a Failure (usage) for a text that cannot be a commit.
+void CheckIsCommit(const std::string& inText);
+
+/// Of a production, session or transaction that is loaded.
+LoadedProduction DescribeProduction(const ZOCL::InterfaceRef<ZOCL::IZOCProduction>& inProduction);
+
 /// By exact name, identifier or URL; an empty commit stands for the newest.
 LoadedProduction LoadProduction(Context& ioContext, const std::string& inWhich, const std::string& inCommit);
 LoadedProduction LoadProductionAt(Context& ioContext, const std::string& inID, const std::string& inCommit);

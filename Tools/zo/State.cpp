@@ -63,8 +63,9 @@ LoginRecord ReadLogin(JSONView inObject) {
 }
 
 OpenRecord ReadOpen(JSONView inObject) {
-    return {TextOf(inObject, "server"), TextOf(inObject, "user"), TextOf(inObject, "production"),
-            TextOf(inObject, "name"), TextOf(inObject, "commit")};
+    return {TextOf(inObject, "server"),     TextOf(inObject, "user"),       TextOf(inObject, "production"),
+            TextOf(inObject, "name"),       TextOf(inObject, "commit"),     TextOf(inObject, "session"),
+            TextOf(inObject, "seenCommit"), TextOf(inObject, "transaction")};
 }
 
 JSONValue Write(const LoginRecord& inLogin) {
@@ -83,6 +84,9 @@ JSONValue Write(const OpenRecord& inOpen) {
     AddToObject(object, "production", inOpen.production);
     AddToObject(object, "name", inOpen.name);
     AddToObject(object, "commit", inOpen.commit);
+    AddToObject(object, "session", inOpen.session);
+    AddToObject(object, "seenCommit", inOpen.seenCommit);
+    AddToObject(object, "transaction", inOpen.transaction);
     return object;
 }
 
@@ -139,6 +143,22 @@ void State::SetOpen(const OpenRecord& inOpen) {
     });
 }
 
+void State::ChangeOpen(const std::string& inServer, const std::string& inUser,
+                       const std::function<void(OpenRecord&)>& inChange) {
+    Update([&](Content& ioContent) {
+        for (OpenRecord& record : ioContent.open) {
+            if (record.server == inServer && record.user == inUser) {
+                inChange(record);
+            }
+        }
+    });
+}
+
+std::string State::LockPath(const std::string& inName) const {
+    MakePrivateDirectory();
+    return ostcore::filesupport::Dir(mDirectory).FilePath(inName + ".lock");
+}
+
 State::Content State::Read() const {
     Content content;
     if (!ostcore::filesupport::File::Exists(mPath)) {
@@ -162,15 +182,18 @@ State::Content State::Read() const {
     return content;
 }
 
-template <class Change>
-void State::Update(Change inChange) {
-    const ostcore::filesupport::Dir directory(mDirectory);
+void State::MakePrivateDirectory() const {
     std::string error;
-    if (!directory.CreatePrivate(&error)) {
+    if (!ostcore::filesupport::Dir(mDirectory).CreatePrivate(&error)) {
         throw Failure(ExitCode::Failure, "making the state directory failed: " + error,
                       "check " + mDirectory);
     }
-    const LockFile lock(directory.FilePath("zo.lock"));
+}
+
+template <class Change>
+void State::Update(Change inChange) {
+    const LockFile lock(LockPath("zo"));
+    std::string error;
     Content content = Read();
     inChange(content);
     JSONValue root = JSONValue::EmptyObject();

@@ -1,6 +1,8 @@
-// What zo remembers between runs: who signed in where, without tokens, and the open production of each.
+// What zo remembers between runs: who signed in where, without tokens, and what each works on: the open
+// production, the session, and a transaction that was left open.
 #pragma once
 
+#include <functional>
 #include <optional>
 #include <string>
 #include <vector>
@@ -24,6 +26,12 @@ struct OpenRecord {
     std::string production;
     std::string name;
     std::string commit;
+    /// URL of the user's session on it; empty while the shared production is read.
+    std::string session = {};
+    /// The commit of the session that this user saw last.
+    std::string seenCommit = {};
+    /// URL of the transaction that was left open; empty when there is none.
+    std::string transaction = {};
 };
 
 /// zo.json in the state directory, mode 0600. Each operation reads the file anew; changes are made under a
@@ -39,6 +47,11 @@ public:
     void SetLogin(const LoginRecord& inLogin);
     std::optional<OpenRecord> Open(const std::string& inServer, const std::string& inUser) const;
     void SetOpen(const OpenRecord& inOpen);
+    /// Changes the record of the open production of a user; nothing when there is none.
+    void ChangeOpen(const std::string& inServer, const std::string& inUser,
+                    const std::function<void(OpenRecord&)>& inChange);
+    /// A file beside the state, for a lock; its directory is there afterwards.
+    std::string LockPath(const std::string& inName) const;
 
     const std::string& Path() const noexcept { return mPath; }
 
@@ -47,6 +60,7 @@ private:
         std::vector<LoginRecord> logins;
         std::vector<OpenRecord> open;
     };
+    void MakePrivateDirectory() const;
     Content Read() const;
     template <class Change>
     void Update(Change inChange);

@@ -3,6 +3,7 @@
 
 #include "Assets.h"
 #include "ostcore/utility/StringConversion.h"
+#include "Sessions.h"
 #include "Verbs.h"
 
 namespace zo {
@@ -79,7 +80,7 @@ void ListShort(Context& ioContext, const std::vector<AssetItem>& inItems) {
 }  // namespace
 
 void RunAssets(Context& ioContext) {
-    const LoadedProduction loaded = LoadOpenProduction(ioContext);
+    const LoadedProduction loaded = LoadForReading(ioContext);
     const auto list = LoadAssetList(ioContext, loaded);
     const std::vector<AssetItem> items = Selected(ioContext, list, loaded.name);
     if (items.empty()) {

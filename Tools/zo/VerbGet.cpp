@@ -9,6 +9,7 @@
 #include "FileNames.h"
 #include "FileWriter.h"
 #include "ostcore/utility/StringConversion.h"
+#include "Sessions.h"
 #include "Verbs.h"
 
 namespace zo {
@@ -55,7 +56,7 @@ public:
     explicit Selection(Context& ioContext) : mContext(ioContext), mArgs(ioContext.Args()) {}
 
     std::vector<Payload> Choose() {
-        const LoadedProduction loaded = LoadOpenProduction(mContext);
+        const LoadedProduction loaded = LoadForReading(mContext);
         const auto list = LoadAssetList(mContext, loaded);
         const std::vector<AssetItem> items = list->GetAllItems();
         const auto named = mArgs.Positional(0);

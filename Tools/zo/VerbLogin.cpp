@@ -146,6 +146,9 @@ void RunLogout(Context& ioContext) {
         ioContext.Out().Say("would sign out " + target.user + " at " + target.server);
         return;
     }
+    ioContext.StartLibrary();
+    // The library forgets it together with the login.
+    const bool hadToken = StoredToken(target.user).Exists();
     std::string trouble;
     try {
         ioContext.Server();
@@ -154,8 +157,7 @@ void RunLogout(Context& ioContext) {
         // An expired login has ended by itself.
         trouble = failure.Code() == ExitCode::NotAuthenticated ? "" : failure.what();
     }
-    ioContext.StartLibrary();
-    const bool hadToken = StoredToken(target.user).Take().has_value();
+    StoredToken(target.user).Take();
     ioContext.Out().Record(json.Set("endedAtHub", trouble.empty()).Set("dryRun", false));
     if (!trouble.empty()) {
         throw Failure(

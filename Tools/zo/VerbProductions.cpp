@@ -4,7 +4,9 @@
 #include "Assets.h"
 #include "Failure.h"
 #include "ostcore/utility/StringConversion.h"
+#include "Sessions.h"
 #include "Verbs.h"
+#include "Writing.h"
 
 namespace zo {
 namespace {
@@ -16,8 +18,10 @@ LoadedProduction NamedOrOpen(Context& ioContext, const std::string& inCommit) {
     if (named) {
         return LoadProduction(ioContext, *named, inCommit);
     }
-    const LoadedProduction open = LoadOpenProduction(ioContext);
-    return inCommit.empty() ? open : LoadProductionAt(ioContext, open.id, inCommit);
+    if (inCommit.empty()) {
+        return LoadForReading(ioContext);
+    }
+    return LoadProductionAt(ioContext, RequireOpen(ioContext).production, inCommit);
 }
 
 // Where a production stands on its shared line.
@@ -36,6 +40,12 @@ Position PositionOf(const LoadedProduction& inProduction, const LoadedProduction
 std::string CommitText(const LoadedProduction& inProduction, const Position& inPosition) {
     return inProduction.commit +
            (inPosition.isLatest ? " (latest)" : " (a newer commit exists: " + inPosition.latestCommit + ")");
+}
+
+const char* ViewOf(const ZOCL::InterfaceRef<ZOCL::IZOCProduction>& inProduction) {
+    return inProduction->IsTransaction()      ? "transaction"
+           : inProduction->IsEditingSession() ? "session"
+                                              : "shared";
 }
 
 void ShowProduction(Context& ioContext, const LoadedProduction& inLoaded) {
@@ -57,6 +67,7 @@ void ShowProduction(Context& ioContext, const LoadedProduction& inLoaded) {
         .Set("modified", production->GetModificationTime());
     json.Set("url", inLoaded.url).Set("template", production->IsTemplate()).Set("commit", inLoaded.commit);
     json.Set("latestCommit", position.latestCommit).Set("isLatest", position.isLatest);
+    json.Set("view", ViewOf(production));
     json.SetList("tags", production->GetTags()).SetList("enclosures", enclosures->GetEnclosureNames());
     Json byType = Json::Part();
     std::string byTypeText;
@@ -68,7 +79,9 @@ void ShowProduction(Context& ioContext, const LoadedProduction& inLoaded) {
 
     Output& out = ioContext.Out();
     out.Record(json);
-    out.Field("production", inLoaded.name);
+    out.Field("production", inLoaded.name + (production->IsTransaction()      ? " (the open transaction)"
+                                             : production->IsEditingSession() ? " (your session)"
+                                                                              : ""));
     out.Field("id", inLoaded.id);
     if (!production->GetDescription().empty()) {
         out.Field("description", ToUTF8(production->GetDescription()));
@@ -149,8 +162,12 @@ void RunOpen(Context& ioContext) {
     ioContext.Server();
     const Target& target = ioContext.ConnectedTarget();
     const auto former = ioContext.Remembered().Open(target.server, target.user);
+    if (former && !former->transaction.empty()) {
+        RefuseWithOpenTransaction(ioContext, "opening a production");
+    }
 
-    LoadedProduction loaded = NamedOrOpen(ioContext, commit);
+    LoadedProduction loaded = args.Positional(0) || !commit.empty() ? NamedOrOpen(ioContext, commit)
+                                                                    : LoadOpenProduction(ioContext);
     const LoadedProduction latest = LoadLatestVersion(ioContext, loaded);
     if (args.Has("latest")) {
         if (!latest.production) {
