@@ -6,6 +6,7 @@ import signal
 import unittest
 
 from harness import (BEHIND, CANCELLED, CHANGED, MEDIA, NOT_FOUND, OK, PATIENCE, USAGE, EndToEndTest)
+from terminal_test import Terminal
 
 CONFLICTS = 3
 PACKET = (b'<x:xmpmeta xmlns:x="adobe:ns:meta/"><rdf:RDF xmlns:rdf="http://www.w3.org/1999/02/22-rdf-syntax-ns#">'
@@ -255,6 +256,44 @@ class Conflicts(Team):
         self.assertEqual(self.ends(self.ada.zo("xmp", "get", "lighthouse.jpg"), OK).out, PACKET + b"<!-- ben -->\n")
         self.assertEqual(assets["anna-take1.mp4"]["description"], "Only Ben")
         self.assertEqual(assets["harbour-wide.mp4"]["description"], "Only Ada")
+
+
+class BeforeAPerson(Team):
+    def test_somebody_elses_transaction_is_waited_for_or_discarded(self):
+        elsewhere = self.sign_in("ada", "ada-elsewhere")
+        self.ok(elsewhere, "set", "--asset", "slate.png", "name=From elsewhere", "--keep-open")
+        asked = Terminal(self.ada, "set", "--asset", "gulls.jpg", "name=From here")
+        asked.wait_for(b"Waiting for changes to be saved by ada on ")
+        asked.wait_for(b"Close Production")
+        self.assertFalse(self.ok(self.ada, "pending").object["leftOpenHere"])
+        asked.type(b"Discard Changes\n")
+        asked.wait_for(b"cannot be undone")
+        asked.type(b"Yes\n")
+        self.assertEqual(asked.end(), OK, asked.said)
+        self.assertIn("From here", self.assets(self.ada))
+        self.ends(elsewhere.zo("commit"), CHANGED)
+
+        # Where nobody can be asked it waits, and goes on when the other is done.
+        self.ok(elsewhere, "set", "--asset", "slate.png", "name=From elsewhere", "--keep-open")
+        waiting = self.ada.start("set", "--asset", "lighthouse.jpg", "name=Waited", "--json")
+        self.ok(elsewhere, "commit")
+        out, err = waiting.communicate(timeout=PATIENCE)
+        self.assertEqual(waiting.returncode, OK, err)
+        self.assertLessEqual({"From elsewhere", "Waited"}, set(self.assets(self.ada)))
+
+    def test_a_discard_is_asked_for_and_conflicts_are_readable(self):
+        self.ok(self.ada, "set", "--asset", "gulls.jpg", "name=Ada's gulls")
+        self.ok(self.ben, "set", "--asset", "gulls.jpg", "name=Ben's gulls")
+        self.share(self.ben)
+        shown = Terminal(self.ada, "latest", "--dry-run", columns=60)
+        self.assertEqual(shown.end(), OK)
+        self.assertRegex(shown.said.decode(), r"mine +updated \(name\) by ada, \d{4}-.*\r\n +theirs +updated \(name\) by ben, ")
+        for answer, code in ((b"\n", CANCELLED), (b"y\n", OK)):
+            asked = Terminal(self.ada, "session", "discard")
+            asked.wait_for(b"[y/N] ")
+            asked.type(answer)
+            self.assertEqual(asked.end(), code, asked.said)
+        self.ends(self.ada.zo("session", "show"), NOT_FOUND)
 
 
 class CutOff(Team):

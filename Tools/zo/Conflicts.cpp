@@ -3,6 +3,7 @@
 
 #include <set>
 
+#include "DisplayWidth.h"
 #include "Failure.h"
 #include "ItemState.h"
 
@@ -256,11 +257,12 @@ Json ConflictJson(const Conflict& inConflict, const char* inState) {
 }
 
 void PrintConflicts(Context& ioContext, const std::vector<Conflict>& inConflicts) {
-    Table table({{"ITEM", 16}, {"MINE", 16}, {"THEIRS", 16}});
+    Output& out = ioContext.Out();
     for (const Conflict& conflict : inConflicts) {
-        table.AddRow({conflict.text, conflict.mine.Text(), conflict.theirs.Text()});
+        out.Line(out.Bold(ForTerminal(conflict.text)));
+        out.Line("  mine    " + ForTerminal(conflict.mine.Text()));
+        out.Line("  theirs  " + ForTerminal(conflict.theirs.Text()));
     }
-    ioContext.Out().Print(table);
 }
 
 }  // namespace zo
