@@ -31,7 +31,7 @@ public:
     }
     ~EchoOff() {
         if (mChanged) {
-            ::tcsetattr(mTerminal, TCSAFLUSH, &mBefore);
+            ::tcsetattr(mTerminal, TCSADRAIN, &mBefore);
         }
     }
     EchoOff(const EchoOff&) = delete;
@@ -149,8 +149,9 @@ private:
         if (isPassword || inControl.type == ControlType::kTextEdit) {
             const U8String held =
                 isPassword || inControl.text.empty() ? U8String() : " [" + inControl.text + "]";
-            Write(WithoutControls(inControl.label + held) + ": ");
+            // Before the question: what is typed the moment it shows is neither seen nor lost.
             const EchoOff echoOff(mSettings.input, isPassword);
+            Write(WithoutControls(inControl.label + held) + ": ");
             if (ReadLine(ioDialog, line) != Line::kRead) {
                 return false;
             }

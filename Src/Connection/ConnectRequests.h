@@ -5,7 +5,7 @@
 
 namespace ZOCL {
 
-/// One connect request: which HTTP request it waits for now.
+/// One connect request: which HTTP request it waits at present.
 class AsyncConnectRequestInfo {
 public:
     explicit AsyncConnectRequestInfo(const InterfaceRef<IZOCDataServer>& inServer) : mServer(inServer) {}

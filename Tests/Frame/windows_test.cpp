@@ -1,5 +1,6 @@
 // Dialogs as their logic sees them: answered by a script, closed from elsewhere, or with nobody to ask; and
 // the progress window around an operation.
+#include <poll.h>
 #include <pty.h>
 #include <unistd.h>
 
@@ -197,7 +198,9 @@ class Terminal {
 public:
     Terminal() { EXPECT_EQ(openpty(&mUser, &mProgram, nullptr, nullptr, nullptr), 0); }
     ~Terminal() {
-        close(mUser);
+        if (mUser >= 0) {
+            close(mUser);
+        }
         close(mProgram);
     }
     Terminal(const Terminal&) = delete;
@@ -205,19 +208,30 @@ public:
 
     int Program() const { return mProgram; }
     void Type(const std::string& inText) {
-        EXPECT_EQ(write(mUser, inText.data(), inText.size()), static_cast<ssize_t>(inText.size()));
+        if (mUser >= 0) {
+            EXPECT_EQ(write(mUser, inText.data(), inText.size()), static_cast<ssize_t>(inText.size()));
+        }
     }
-    /// Reads until the text has appeared; all that was shown since the last call.
+    /// Reads until the text has appeared; all that was shown since the last call. A text that
+    /// does not come hangs up, so that the program sees the end of its input.
     std::string WaitFor(const std::string& inText) {
         std::string shown;
         char character = 0;
-        while (shown.find(inText) == std::string::npos && read(mUser, &character, 1) == 1) {
+        while (mUser >= 0 && shown.find(inText) == std::string::npos) {
+            pollfd watched{mUser, POLLIN, 0};
+            if (poll(&watched, 1, kPatienceMilliseconds) != 1 || read(mUser, &character, 1) != 1) {
+                ADD_FAILURE() << "waited for \"" << inText << "\" and saw \"" << shown << "\"";
+                close(mUser);
+                mUser = -1;
+                return shown;
+            }
             shown += character;
         }
         return shown;
     }
 
 private:
+    static constexpr int kPatienceMilliseconds = 60000;
     int mUser = -1;
     int mProgram = -1;
 };
