@@ -1,6 +1,7 @@
 // One SQLite connection with its prepared statements.
 #include "Store/SqliteConnection.h"
 
+#include <cerrno>
 #include <stdexcept>
 
 #include "Base/Error.h"
@@ -16,7 +17,9 @@ constexpr int kBusyMilliseconds = 15000;
     if (code == SQLITE_BUSY || code == SQLITE_LOCKED)
         throw Failure(503, "database-busy",
                       "The database is in use by another long write; try the request again in a moment.");
-    if (code == SQLITE_FULL)
+    bool const isFull =
+        code == SQLITE_FULL || (code == SQLITE_IOERR && sqlite3_system_errno(inDatabase) == ENOSPC);
+    if (isFull)
         throw Failure(507, "storage-full",
                       "The hub's disk is full; nothing was changed. Make room and repeat it.");
     throw std::runtime_error(std::string("database: ") + inWhat + ": " + sqlite3_errmsg(inDatabase));

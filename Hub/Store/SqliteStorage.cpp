@@ -17,11 +17,10 @@ constexpr std::size_t kIdleConnections = 8;
 
 class SqliteStorage : public Storage {
 public:
-    explicit SqliteStorage(std::string const& inDirectory) : mPath(inDirectory + "/hub.sqlite") {
-        auto connection = std::make_unique<SqliteConnection>(mPath);
+    explicit SqliteStorage(std::string const& inDirectory)
+        : mPath(inDirectory + "/hub.sqlite"), mKeeper(mPath) {
         chmod(mPath.c_str(), S_IRUSR | S_IWUSR);
-        PrepareSchema(*connection, mPath);
-        Return(std::move(connection));
+        PrepareSchema(mKeeper, mPath);
     }
 
     std::unique_ptr<Transaction> BeginRead() override { return Begin("BEGIN DEFERRED"); }
@@ -55,6 +54,9 @@ private:
     }
 
     std::string const mPath;
+    /// Does nothing but stay: with the last connection SQLite's shared index would go, and to make it anew
+    /// takes room, so that on a full disk even reading would fail.
+    SqliteConnection mKeeper;
     std::mutex mMutex;
     std::vector<std::unique_ptr<SqliteConnection>> mIdle;
 };
