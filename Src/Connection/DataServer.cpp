@@ -80,13 +80,13 @@ void DataServer::InitFromDiscoveryURL(const Settings& inSettings) {
         credentials.token = leftByHost;
     }
     mAnchor = boost::make_shared<Anchor>(this);
-    mChain = BuildRequestChain(
-        [anchor = mAnchor] {
-            if (const InterfaceRef<DataServer> server = anchor->Lock()) {
-                server->GetNewAuthToken();
-            }
-        },
-        credentials.token);
+    ChainCallbacks callbacks;
+    callbacks.tokenNotification = [anchor = mAnchor] {
+        if (const InterfaceRef<DataServer> server = anchor->Lock()) {
+            server->GetNewAuthToken();
+        }
+    };
+    mChain = BuildRequestChain(callbacks, credentials.token);
     ScopedLock lock(IZOCDataServer::GetLock(), "DataServer::InitFromDiscoveryURL");
     mCredentials = std::move(credentials);
     mSavedCredentials = std::move(saved);

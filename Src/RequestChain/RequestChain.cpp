@@ -3,12 +3,12 @@
 
 namespace ZOCL {
 
-RequestChain BuildRequestChain(const function<void()>& inTokenNotification, const ImmutableString& inToken) {
+RequestChain BuildRequestChain(const ChainCallbacks& inCallbacks, const ImmutableString& inToken) {
     RequestChain chain;
     chain.global = ostnet::http::GetGlobalRequestProcessor();
     chain.recoverableError = boost::make_shared<RecoverableErrorProcessor>(chain.global);
     chain.authorization =
-        boost::make_shared<AuthorizationProcessor>(chain.recoverableError, inTokenNotification);
+        boost::make_shared<AuthorizationProcessor>(chain.recoverableError, inCallbacks.tokenNotification);
     chain.authorization->SetAuthToken(inToken);
     chain.common = chain.authorization;
     chain.upload = chain.common;

@@ -7,24 +7,32 @@
 
 namespace ZOCL {
 
-/// The layers of one data server, from the network up.
+/// What the layers tell their data server. Each is called with no lock held; an empty one is not called.
+struct ChainCallbacks {
+    /// A token was refused, and a new one is wanted. Runs on a worker of the base processor.
+    function<void()> tokenNotification;
+    /// True: the network looks down. False: it is back. Runs on a CPU-bound executor.
+    function<void(bool)> recoverableErrors;
+};
+
+/// The layers of one data server, in their order from the network up:
 ///
-/// | Zone              | Layer                     | Sees |
-/// |-------------------|---------------------------|---------------------------------------------------------|
-/// | network           | global                    | every request; login and discovery enter here directly |
-/// | recovery          | recoverableError          | every request of the verbs | | identity          |
-/// authorization             | the same; what is above it has no token yet             | | entry of verbs |
-/// common                    | GET, HEAD, DELETE                                       | | entry of payloads
-/// | upload                    | PUT, POST                                               |
+///  - `global`: every request; login and discovery enter here directly.
+///  - `recoverableError`: every request of the verbs.
+///  - `authorization`: the same; what is above it has no token yet.
+///  - `cache`: null when there is none.
+///  - `common`: where GET, HEAD and DELETE enter.
+///  - `upload`: where PUT and POST enter.
 struct RequestChain {
     shared_ptr<ostnet::http::RequestProcessor> global;
     shared_ptr<RecoverableErrorProcessor> recoverableError;
     shared_ptr<AuthorizationProcessor> authorization;
+    shared_ptr<ostnet::http::RequestProcessor> cache;
     shared_ptr<ostnet::http::RequestProcessor> common;
     shared_ptr<ostnet::http::RequestProcessor> upload;
 };
 
 /// Builds the layers over the global processor of this moment.
-RequestChain BuildRequestChain(const function<void()>& inTokenNotification, const ImmutableString& inToken);
+RequestChain BuildRequestChain(const ChainCallbacks& inCallbacks, const ImmutableString& inToken);
 
 }  // namespace ZOCL
