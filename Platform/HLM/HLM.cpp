@@ -21,6 +21,8 @@ std::atomic<bool>& Headless() {
     return isHeadless;
 }
 
+std::atomic<bool> gWaitsForNetwork{false};
+
 struct Ending {
     ostcore::threads::Mutex mutex;
     ostcore::function<void()> function ZO_GUARDED_BY(mutex);
@@ -38,6 +40,13 @@ bool GetIsHeadless() {
 }
 void SetIsHeadless(bool inIsHeadless) {
     Headless().store(inIsHeadless, std::memory_order_relaxed);
+}
+
+bool GetWaitsForNetwork() {
+    return gWaitsForNetwork;
+}
+void SetWaitsForNetwork(bool inWaits) {
+    gWaitsForNetwork = inWaits;
 }
 
 void SetEndProcessFunction(ostcore::function<void()> inFunction) {

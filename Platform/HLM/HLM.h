@@ -12,6 +12,11 @@ ZOPLATFORM_EXPORT bool GetIsHeadless();
 /// Called by a host before it starts the library.
 ZOPLATFORM_EXPORT void SetIsHeadless(bool inIsHeadless);
 
+/// Whether a headless process waits for a network that is down without an end, as one does that somebody
+/// watches. False, as at the start: it ends after 15 seconds (SetEndProcessFunction). Threads: any.
+ZOPLATFORM_EXPORT bool GetWaitsForNetwork();
+ZOPLATFORM_EXPORT void SetWaitsForNetwork(bool inWaits);
+
 /// How this process ends when the library cannot go on without a user; a host that ends in a way of its own
 /// says so here. An empty function, as at the start, means std::exit with EXIT_FAILURE. Threads: any.
 ZOPLATFORM_EXPORT void SetEndProcessFunction(ostcore::function<void()> inFunction);

@@ -86,6 +86,11 @@ void DataServer::InitFromDiscoveryURL(const Settings& inSettings) {
             server->GetNewAuthToken();
         }
     };
+    callbacks.recoverableErrors = [anchor = mAnchor](bool inDetected) {
+        if (const InterfaceRef<DataServer> server = anchor->Lock()) {
+            server->WarnAboutRecoverableErrors(inDetected);
+        }
+    };
     mChain = BuildRequestChain(callbacks, credentials.token);
     ScopedLock lock(IZOCDataServer::GetLock(), "DataServer::InitFromDiscoveryURL");
     mCredentials = std::move(credentials);

@@ -5,6 +5,7 @@
 #include <unordered_map>
 
 #include "Connection/ServiceDocument.h"
+#include "ostcore/threads/Scheduler.h"
 #include "RequestChain/RequestChain.h"
 #include "ResourceCaches.h"
 #include "ZOClient/IZOCDataServer.h"
@@ -13,6 +14,7 @@ namespace ZOCL {
 
 class ReconnectDialog;
 class ResourceFactory;
+class ZONetworkUnavailableDialog;
 
 /// One server as the client sees it.
 ///
@@ -65,11 +67,17 @@ public:
     /// Notes that the token is lost and has ShowWarningsIfNeeded run on the main thread, unless both has
     /// happened. Any thread.
     void ScheduleWarnings();
-    /// Tells the user what is wrong, if anything is. Main thread; may run windows.
-    void ShowWarningsIfNeeded();
     /// Takes a token that the hub gave for this login elsewhere; what waits for one goes on. False when the
     /// use of this server has ended. Any thread.
     bool AdoptToken(const ImmutableString& inToken);
+
+    // --- A network that is down (DataServerRecovery.cpp).
+
+    /// Told by the chain: true while requests fail one after the other, false when one came through again.
+    /// Any thread.
+    void WarnAboutRecoverableErrors(bool inDetected);
+    /// Tells the user what is wrong, if anything is. Main thread; may run windows.
+    void ShowWarningsIfNeeded();
 
     struct FilledTables {
         bool root = false;
@@ -190,11 +198,19 @@ private:
     void UpdateLoginData() ZO_REQUIRES(IZOCDataServer::GetLock());
     bool BecomeLoggedInServer();
     void OnRenewed(const Guid& inRequest, int inResult, const InterfaceRef<IZOCDataServer>& inServer);
+    void ShowTokenLostIfNeeded();
     void PromptForReconnect();
     /// False when the user gave up.
     bool AskUntilReconnected(ReconnectDialog& ioDialog, const ZOLoginData& inLoginData);
+    void OnNetworkDown();
+    void OnNetworkBack();
+    void QueueShowWarnings();
+    void PromptForRecoverableErrors();
+    void SignOutFromWarning();
+    void CloseNetworkWarning();
+    void HandleHeadlessNetworkFailureTimeout();
     /// Only a headless process: tells the host and ends the process.
-    void ReportFatalHeadlessError(const char* inMessage);
+    void ReportFatalHeadlessError(const std::string& inMessage);
     bool HasUseEnded() const;
     /// Signs a token out that came too late to be used.
     void Revoke(const ImmutableString& inToken);
@@ -228,6 +244,13 @@ private:
     /// The sign-in that renews the token, the null identifier when there is none.
     Guid mRenewal ZO_GUARDED_BY(IZOCDataServer::GetLock());
     shared_ptr<ReconnectDialog> mReconnectDialog ZO_GUARDED_BY(IZOCDataServer::GetLock());
+    shared_ptr<ZONetworkUnavailableDialog> mNetworkWarning ZO_GUARDED_BY(IZOCDataServer::GetLock());
+    /// When the present failure began, in a headless process alone.
+    optional<ostcore::threads::MonotonicTime> mFirstFailureTime ZO_GUARDED_BY(IZOCDataServer::GetLock());
+    /// The network is considered down.
+    std::atomic<bool> mWarnAboutErrors{false};
+    /// PromptForRecoverableErrors runs.
+    std::atomic<bool> mPromptActive{false};
     std::atomic<bool> mTokenLost{false};
     std::atomic<bool> mReconnectActive{false};
     std::unordered_map<ImmutableString, InterfaceRef<IZOCProduction>> mProductionCache

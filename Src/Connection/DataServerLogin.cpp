@@ -138,6 +138,7 @@ void DataServer::EndUse() {
         renewal = mRenewal;
         dialog = mReconnectDialog;
     }
+    CloseNetworkWarning();
     // A sign-in that is under way ends, and takes what is parked with it; what waits for the user ends here.
     CancelConnectRequest(renewal);
     if (dialog) {

@@ -9,7 +9,6 @@
 #include "ostcore/config/ZString.h"
 #include "ostcore/debug/Assert.h"
 #include "ostcore/debug/Trace.h"
-#include "ostcore/threads/MainThread.h"
 #include "ostcore/utility/StringConversion.h"
 #include "ostui/BackEnd.h"
 #include "ZOClient/Messages.h"
@@ -105,10 +104,10 @@ void DataServer::ScheduleWarnings() {
     if (mTokenLost.exchange(true)) {
         return;
     }
-    RFL::AsyncCallFromMainThread([self = InterfaceRef<DataServer>(this)] { self->ShowWarningsIfNeeded(); });
+    QueueShowWarnings();
 }
 
-void DataServer::ShowWarningsIfNeeded() {
+void DataServer::ShowTokenLostIfNeeded() {
     if (!mTokenLost) {
         return;
     }
@@ -122,27 +121,8 @@ void DataServer::ShowWarningsIfNeeded() {
     ReportFatalHeadlessError(kRenewalImpossible);
 }
 
-void DataServer::ReportFatalHeadlessError(const char* inMessage) {
-    if (!HLM::GetIsHeadless()) {
-        return;
-    }
-    function<void(const UString&)> report;
-    {
-        ScopedLock lock(IZOCDataServer::GetLock(), "DataServer::ReportFatalHeadlessError");
-        report = mFatalErrorFunction;
-    }
-    if (report) {
-        report(ostcore::utility::ToUTF16(inMessage));
-    }
-    if (ostcore::debug::TraceEnabled("ZOCL", ostcore::debug::kTraceLevel_Fatal)) {
-        ostcore::debug::Trace("ZOCL", ostcore::debug::kTraceLevel_Fatal,
-                              std::string("Exiting process: ") + inMessage);
-    }
-    ostcore::threads::AsyncCallFromMainThread([] { HLM::EndProcess(); });
-}
-
 void DataServer::PromptForReconnect() {
-    if (!mTokenLost || mReconnectActive.exchange(true)) {
+    if (!mTokenLost || mWarnAboutErrors || mReconnectActive.exchange(true)) {
         return;
     }
     const ZOLoginData loginData = GetLoginData();
@@ -167,8 +147,7 @@ void DataServer::PromptForReconnect() {
     mReconnectActive = false;
     // The new token may have been lost already, when nobody could be asked since this was still going on.
     if (!isGivenUp && mTokenLost && !HasUseEnded()) {
-        RFL::AsyncCallFromMainThread(
-            [self = InterfaceRef<DataServer>(this)] { self->ShowWarningsIfNeeded(); });
+        QueueShowWarnings();
     }
 }
 

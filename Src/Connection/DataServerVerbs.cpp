@@ -1,12 +1,26 @@
 // The verbs: where each enters the chain, and their blocking forms.
 #include "Connection/DataServer.h"
 #include "Connection/SynchronousRequest.h"
+#include "ostnet/HeaderConstants.h"
 
 namespace ZOCL {
 
 using ostnet::Headers;
 using ostnet::http::Form;
 using ostnet::http::RequestOptions;
+
+namespace {
+
+/// By its identifier the server knows a change that is sent again, since its answer was lost or its token
+/// refused, and does not do it twice. A key of the caller's own goes first.
+Headers WithIdempotencyKey(Headers inHeaders, const Guid& inRequestID) {
+    if (inHeaders.find(ostnet::kHEADER_IDEMPOTENCY_KEY) == inHeaders.end()) {
+        inHeaders.emplace(ostnet::kHEADER_IDEMPOTENCY_KEY, ImmutableString(inRequestID.ToString()));
+    }
+    return inHeaders;
+}
+
+}  // namespace
 
 void DataServer::TryToCancelRequest(const Guid& inRequestID) {
     mChain.upload->TryToCancelRequest(inRequestID);
@@ -30,7 +44,8 @@ bool DataServer::DELETE(const Guid& inRequestID, const Completion& inCompletion,
                         Headers inHeaders) {
     const ImmutableString url = MakeRequestURL(inURL);
     return !url.IsNull() &&
-           mChain.common->DELETE(inRequestID, inCompletion, url, std::move(inHeaders), RequestOptions());
+           mChain.common->DELETE(inRequestID, inCompletion, url,
+                                 WithIdempotencyKey(std::move(inHeaders), inRequestID), RequestOptions());
 }
 
 bool DataServer::POST(const Guid& inRequestID, const Completion& inCompletion, const ImmutableString& inURL,
@@ -38,7 +53,8 @@ bool DataServer::POST(const Guid& inRequestID, const Completion& inCompletion, c
     const ImmutableString url = MakeRequestURL(inURL);
     const auto& entry = SupportsUploadCompression() ? mChain.upload : mChain.common;
     return !url.IsNull() &&
-           entry->POST(inRequestID, inCompletion, url, std::move(inHeaders), inPayload, RequestOptions());
+           entry->POST(inRequestID, inCompletion, url, WithIdempotencyKey(std::move(inHeaders), inRequestID),
+                       inPayload, RequestOptions());
 }
 
 bool DataServer::POST(const Guid& inRequestID, const Completion& inCompletion, const ImmutableString& inURL,
@@ -46,7 +62,8 @@ bool DataServer::POST(const Guid& inRequestID, const Completion& inCompletion, c
     const ImmutableString url = MakeRequestURL(inURL);
     const auto& entry = SupportsUploadCompression() ? mChain.upload : mChain.common;
     return !url.IsNull() &&
-           entry->POST(inRequestID, inCompletion, url, std::move(inHeaders), inForm, RequestOptions());
+           entry->POST(inRequestID, inCompletion, url, WithIdempotencyKey(std::move(inHeaders), inRequestID),
+                       inForm, RequestOptions());
 }
 
 bool DataServer::PUT(const Guid& inRequestID, const Completion& inCompletion, const ImmutableString& inURL,
@@ -54,7 +71,8 @@ bool DataServer::PUT(const Guid& inRequestID, const Completion& inCompletion, co
     const ImmutableString url = MakeRequestURL(inURL);
     const auto& entry = SupportsUploadCompression() ? mChain.upload : mChain.common;
     return !url.IsNull() &&
-           entry->PUT(inRequestID, inCompletion, url, std::move(inHeaders), inPayload, RequestOptions());
+           entry->PUT(inRequestID, inCompletion, url, WithIdempotencyKey(std::move(inHeaders), inRequestID),
+                      inPayload, RequestOptions());
 }
 
 bool DataServer::PUT(const Guid& inRequestID, const Completion& inCompletion, const ImmutableString& inURL,
@@ -62,7 +80,8 @@ bool DataServer::PUT(const Guid& inRequestID, const Completion& inCompletion, co
     const ImmutableString url = MakeRequestURL(inURL);
     const auto& entry = SupportsUploadCompression() ? mChain.upload : mChain.common;
     return !url.IsNull() &&
-           entry->PUT(inRequestID, inCompletion, url, std::move(inHeaders), inForm, RequestOptions());
+           entry->PUT(inRequestID, inCompletion, url, WithIdempotencyKey(std::move(inHeaders), inRequestID),
+                      inForm, RequestOptions());
 }
 
 bool DataServer::GETByContentID(const ImmutableString&, const Guid& inRequestID,

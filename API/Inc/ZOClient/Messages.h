@@ -22,6 +22,13 @@ struct ZOCL_EXPORT ZOTerminateConnectionMessage : RFL::MessageImpl<ZOTerminateCo
     bool forced = false;
 };
 
+/// The network to the hub of a data server looks down, after several failures in a row, or is back. Requests
+/// wait and are tried again meanwhile; a host can show that without a window. A failure that outlives the
+/// user's wait is told again.
+struct ZOCL_EXPORT ZONetworkStateMessage : RFL::MessageImpl<ZONetworkStateMessage> {
+    bool isDown = false;
+};
+
 /// A connect request has ended; posted before its completion is called.
 struct ZOCL_EXPORT IZOCDataServer::LoginCompleteMessage
     : RFL::MessageImpl<IZOCDataServer::LoginCompleteMessage> {
