@@ -47,8 +47,10 @@ public:
 
     /// The value under a key, which counts as used now; none when there is none.
     optional<Value> Lookup(const Key& inKey) { return mCore->Lookup(inKey); }
-    /// Takes the place of a value that is there.
-    void Insert(const Key& inKey, Value inValue) { mCore->Insert(inKey, std::move(inValue)); }
+    /// Returns the value whose place it takes, for the caller to release where that does no harm.
+    optional<Value> Insert(const Key& inKey, Value inValue) {
+        return mCore->Insert(inKey, std::move(inValue));
+    }
     /// Takes all entries out and releases them on this thread.
     void Clear() { mCore->Clear(); }
     std::size_t Size() const { return mCore->Size(); }
@@ -78,18 +80,21 @@ private:
             return found->second.value;
         }
 
-        void Insert(const Key& inKey, Value&& inValue) ZO_EXCLUDES(mMutex) {
-            Entry entry{mScheduler->Now(), std::move(inValue)};
+        optional<Value> Insert(const Key& inKey, Value&& inValue) ZO_EXCLUDES(mMutex) {
+            const Time now = mScheduler->Now();
+            optional<Value> former;
             {
                 ostcore::threads::MutexLock lock(mMutex);
                 const auto found = mEntries.find(inKey);
                 if (found == mEntries.end()) {
-                    mEntries.emplace(inKey, std::move(entry));
+                    mEntries.emplace(inKey, Entry{now, std::move(inValue)});
                 } else {
-                    std::swap(found->second, entry);  // the former value goes outside the lock
+                    former = std::exchange(found->second.value, std::move(inValue));
+                    found->second.lastAccess = now;
                 }
             }
             QueueSweep();
+            return former;
         }
 
         void Clear() ZO_EXCLUDES(mMutex) {

@@ -188,14 +188,12 @@ bool NetworkProcessor::Core::Post(const function<void()>& inFunction, std::uint3
     return mDelayed->Add(inFunction, inDelayMilliseconds);
 }
 
+// A layer above may hold the request back, or send it under an ID of its own; so a worker that says that it is
+// about to block is replaced in any case.
 bool NetworkProcessor::Core::Waiting(const Guid& inRequestID) {
-    {
-        MutexLock lock(mMutex);
-        if (mRegister.count(inRequestID) == 0) {
-            return false;
-        }
-    }
-    return mWorkers.AboutToBlock();
+    const bool goesOn = mWorkers.AboutToBlock();
+    MutexLock lock(mMutex);
+    return goesOn && mRegister.count(inRequestID) > 0;
 }
 
 void NetworkProcessor::Core::PostEnded(NetworkThread::Exchanges& ioEnded) {

@@ -261,6 +261,29 @@ TEST(Workers, BlockedOnesAreReplaced) {
     EXPECT_EQ(requester.Done().Total(), static_cast<std::size_t>(kBlocked));
 }
 
+TEST(Workers, AreReplacedAlsoForARequestThatALayerAboveHolds) {
+    Requester requester;
+    auto& processor = requester.Processor();
+    Signal goOn;
+    std::atomic<int> wentOn{0};
+    Signal held[2];
+    for (Signal& signal : held) {
+        processor.PostFunction(
+            [&] {
+                processor.WaitingForRequest(Guid::CreateUnique(), ostnet::http::kWaitForever);
+                signal.Set();
+                wentOn += goOn.Wait() ? 1 : 0;
+            },
+            0);
+    }
+    for (Signal& signal : held) {
+        EXPECT_TRUE(signal.Wait());
+    }
+    processor.PostFunction([&] { goOn.Set(); }, 0);
+    processor.Shutdown();
+    EXPECT_EQ(wentOn, 2);
+}
+
 TEST(Workers, SurviveAThrowingCompletion) {
     RawServer server(
         RawServer::Answering([](const ReceivedRequest&) { return RawServer::Answer(200, "ok"); }));
