@@ -1,0 +1,68 @@
+#include "QM/detail/DirectoryIndex.h"
+
+namespace QM {
+namespace detail {
+
+void DirectoryIndex::Unlink(Entry& ioEntry) {
+    (ioEntry.older ? ioEntry.older->newer : mOldest) = ioEntry.newer;
+    (ioEntry.newer ? ioEntry.newer->older : mNewest) = ioEntry.older;
+}
+
+void DirectoryIndex::LinkNewest(Entry& ioEntry) {
+    ioEntry.older = mNewest;
+    ioEntry.newer = nullptr;
+    (mNewest ? mNewest->newer : mOldest) = &ioEntry;
+    mNewest = &ioEntry;
+}
+
+bool DirectoryIndex::Touch(const EntryKey& inKey) {
+    const auto found = mEntries.find(inKey);
+    if (found == mEntries.end()) {
+        return false;
+    }
+    Unlink(found->second);
+    LinkNewest(found->second);
+    return true;
+}
+
+void DirectoryIndex::Insert(const EntryKey& inKey, std::uint64_t inSize) {
+    const auto inserted = mEntries.try_emplace(inKey);
+    Entry& entry = inserted.first->second;
+    if (inserted.second) {
+        entry.key = &inserted.first->first;
+    } else {
+        Unlink(entry);
+        mBytes -= entry.size;
+    }
+    entry.size = inSize;
+    mBytes += inSize;
+    LinkNewest(entry);
+}
+
+bool DirectoryIndex::Remove(const EntryKey& inKey) {
+    const auto found = mEntries.find(inKey);
+    if (found == mEntries.end()) {
+        return false;
+    }
+    Unlink(found->second);
+    mBytes -= found->second.size;
+    mEntries.erase(found);
+    return true;
+}
+
+bool DirectoryIndex::TakeOldest(EntryKey& outKey, std::uint64_t& outSize) {
+    if (!mOldest) {
+        return false;
+    }
+    outKey = *mOldest->key;
+    outSize = mOldest->size;
+    return Remove(outKey);
+}
+
+std::uint64_t DirectoryIndex::SizeOf(const EntryKey& inKey) const {
+    const auto found = mEntries.find(inKey);
+    return found == mEntries.end() ? 0 : found->second.size;
+}
+
+}  // namespace detail
+}  // namespace QM

@@ -1,0 +1,390 @@
+#include "QM/detail/FileDataCache.h"
+
+#include "ostcore/debug/Trace.h"
+
+namespace QM {
+namespace detail {
+
+using ostcore::threads::MutexLock;
+
+namespace {
+
+const ostcore::debug::TraceChannel& Channel() {
+    static const ostcore::debug::TraceChannel sChannel("QM.DataCache");
+    return sChannel;
+}
+
+constexpr std::uint64_t kMaximumPendingBytes = 64ull << 20;
+/// The look at a large directory costs a fraction of a second, which a short-lived process need not pay for a
+/// few reads.
+constexpr std::size_t kLookupsBeforeLook = 32;
+constexpr std::size_t kMaximumKnownNames = 16;
+constexpr std::chrono::minutes kLookPeriod{10};
+
+/// How many writes of this process make another look worth while.
+std::size_t WritesBetweenLooks(std::size_t inMaximumCount) {
+    return std::max<std::size_t>(inMaximumCount / 32, 64);
+}
+
+}  // namespace
+
+shared_ptr<FileDataCache> FileDataCache::Create(shared_ptr<CacheDirectory> inDirectory) {
+    return shared_ptr<FileDataCache>(new FileDataCache(std::move(inDirectory)));
+}
+
+FileDataCache::FileDataCache(shared_ptr<CacheDirectory> inDirectory)
+    : mDirectory(std::move(inDirectory)),
+      mReaders(ostcore::threads::CreateIOBoundExecutor("content cache")),
+      mWriter(ostcore::threads::CreateSubExecutor(mReaders)),
+      mIndex(boost::make_shared<DirectoryIndex>()) {}
+
+// --- Looking up and reading.
+
+/// Whether there is such a file, by what is known or else by a question to the system: another process may
+/// have written it.
+bool FileDataCache::IsStored(const EntryKey& inKey) {
+    {
+        MutexLock lock(mMutex);
+        if (mPending.count(inKey) > 0 || mIndex->Contains(inKey)) {
+            return true;
+        }
+    }
+    return mDirectory->Exists(inKey);
+}
+
+std::vector<ImmutableString> FileDataCache::ListNames(const ImmutableString& inKey) {
+    std::vector<ImmutableString> found;
+    if (inKey.empty() || mIsClosed) {
+        return found;
+    }
+    EntryKey key = MakeEntryKeyWithoutName(inKey);
+    std::set<std::string> candidates;
+    bool areNamesKnown = false;
+    bool isLookDue = false;
+    {
+        MutexLock lock(mMutex);
+        candidates = mKnownNames;
+        areNamesKnown = mHasLooked;
+        isLookDue = ++mLookups == kLookupsBeforeLook;
+    }
+    if (isLookDue) {
+        PostLook();
+    }
+    // Before the first look nobody knows which names there are.
+    if (!areNamesKnown) {
+        const std::vector<std::string> listed = mDirectory->ListNames(key);
+        candidates.insert(listed.begin(), listed.end());
+    }
+    for (const std::string& name : candidates) {
+        if (SetName(key, name) && IsStored(key)) {
+            found.emplace_back(name);
+        }
+    }
+    return found;
+}
+
+bool FileDataCache::Contains(const ImmutableString& inKey, const ImmutableString& inName) {
+    EntryKey key;
+    return !mIsClosed && MakeEntryKey(inKey, inName, key) && IsStored(key);
+}
+
+int FileDataCache::Read(const ImmutableString& inKey, const ImmutableString& inName,
+                        const ReadCompletion& inCompletion, Payload& outPayload) {
+    EntryKey key;
+    if (mIsClosed || !inCompletion || !MakeEntryKey(inKey, inName, key)) {
+        return kResultFailure;
+    }
+    {
+        MutexLock lock(mMutex);
+        const auto pending = mPending.find(key);
+        if (pending != mPending.end()) {
+            outPayload = pending->second;
+            return kResultContentAvailable;
+        }
+    }
+    if (!IsStored(key)) {
+        return kResultFailure;
+    }
+    const auto self = shared_from_this();
+    const bool isPosted = mReaders->Post([self, key, inCompletion] { self->ReadFile(key, inCompletion); });
+    return isPosted ? kResultContentPending : kResultFailure;
+}
+
+void FileDataCache::ReadFile(const EntryKey& inKey, const ReadCompletion& inCompletion) {
+    shared_ptr<RecycledMemory> payload;
+    const CacheDirectory::Outcome outcome = mDirectory->Read(inKey, payload);
+    if (outcome == CacheDirectory::Outcome::kRead) {
+        NoteUse(inKey, CacheDirectory::FileSizeOf(payload->size()));
+    } else if (outcome != CacheDirectory::Outcome::kFailed) {
+        MutexLock lock(mMutex);
+        mIndex->Remove(inKey);
+    }
+    if (outcome == CacheDirectory::Outcome::kDamaged) {
+        ostcore::debug::Trace(Channel(), ostcore::debug::kTraceLevel_Error,
+                              "A file of the cache was damaged and has been dropped: " + FileNameOf(inKey));
+    }
+    inCompletion(payload ? 0 : kResultFailure, payload);
+}
+
+/// A file that another process has written counts from its first use on.
+void FileDataCache::NoteUse(const EntryKey& inKey, std::uint64_t inSize) {
+    MutexLock lock(mMutex);
+    if (mIndex->Touch(inKey)) {
+        return;
+    }
+    mIndex->Insert(inKey, inSize);
+    const bool isTooMuch = mIndex->Count() > mMaximumCount || mIndex->Bytes() > mMaximumBytes;
+    lock.Unlock();
+    if (isTooMuch) {
+        PostMakeRoom();
+    }
+}
+
+// --- Writing.
+
+bool FileDataCache::Write(const ImmutableString& inKey, const ImmutableString& inName,
+                          const Payload& inPayload) {
+    EntryKey key;
+    if (mIsClosed || !inPayload || inPayload->size() > CacheDirectory::kMaximumPayloadSize ||
+        !MakeEntryKey(inKey, inName, key)) {
+        return false;
+    }
+    {
+        MutexLock lock(mMutex);
+        const bool isQueueFull =
+            !mPending.empty() && mPendingBytes + inPayload->size() > kMaximumPendingBytes;
+        if (isQueueFull || inPayload->size() > mMaximumBytes / 4) {
+            return false;
+        }
+        mPendingBytes += inPayload->size();
+        if (mKnownNames.size() < kMaximumKnownNames) {
+            mKnownNames.emplace(inName.view());
+        }
+        Payload& pending = mPending[key];
+        const bool isOnItsWay = pending != nullptr;
+        if (isOnItsWay) {
+            mPendingBytes -= pending->size();
+        }
+        pending = inPayload;
+        if (isOnItsWay) {
+            return true;
+        }
+    }
+    const auto self = shared_from_this();
+    if (mWriter->Post([self, key] { self->WritePending(key); })) {
+        return true;
+    }
+    MutexLock lock(mMutex);
+    DropPending(key);
+    return false;
+}
+
+void FileDataCache::DropPending(const EntryKey& inKey) {
+    const auto found = mPending.find(inKey);
+    if (found != mPending.end()) {
+        mPendingBytes -= found->second->size();
+        mPending.erase(found);
+        mWritten.NotifyAll();
+    }
+}
+
+Payload FileDataCache::FindPending(const EntryKey& inKey) {
+    MutexLock lock(mMutex);
+    const auto found = mPending.find(inKey);
+    return found == mPending.end() ? Payload() : found->second;
+}
+
+/// Writes what waits under the key, and what came in its place meanwhile.
+void FileDataCache::WritePending(const EntryKey& inKey) {
+    while (const Payload payload = FindPending(inKey)) {
+        WriteWithinBounds(inKey, payload);
+        MutexLock lock(mMutex);
+        const auto found = mPending.find(inKey);
+        if (found != mPending.end() && found->second == payload) {
+            DropPending(inKey);
+            return;
+        }
+        const bool isRemoved = found == mPending.end();
+        lock.Unlock();
+        if (isRemoved) {
+            RemoveFile(inKey);
+        }
+    }
+}
+
+void FileDataCache::WriteWithinBounds(const EntryKey& inKey, const Payload& inPayload) {
+    if (!LookIfItIsTime()) {
+        return;
+    }
+    const std::uint64_t size = CacheDirectory::FileSizeOf(inPayload->size());
+    if (MakeRoom(&inKey, size) && mDirectory->Write(inKey, inPayload->view())) {
+        MutexLock lock(mMutex);
+        mIndex->Insert(inKey, size);
+    }
+    ++mWritesSinceLook;
+}
+
+/// Takes the file out of the index whose turn it is to go, if one has to.
+bool FileDataCache::TakeVictim(const EntryKey* inFor, std::uint64_t inSize, EntryKey& outVictim,
+                               std::uint64_t& outSize) {
+    MutexLock lock(mMutex);
+    const bool isNew = inFor && !mIndex->Contains(*inFor);
+    const std::uint64_t replaced = inFor ? mIndex->SizeOf(*inFor) : 0;
+    const bool fits = mIndex->Count() + (isNew ? 1 : 0) <= mMaximumCount &&
+                      mIndex->Bytes() - replaced + inSize <= mMaximumBytes;
+    return !fits && mIndex->TakeOldest(outVictim, outSize);
+}
+
+/// Removes files until one of that size can be added; with null, until the bounds are kept as it is. False
+/// when one could not be removed, which counts on, behind all others.
+bool FileDataCache::MakeRoom(const EntryKey* inFor, std::uint64_t inSize) {
+    EntryKey victim;
+    std::uint64_t size = 0;
+    while (TakeVictim(inFor, inSize, victim, size)) {
+        if (!mDirectory->Remove(victim)) {
+            MutexLock lock(mMutex);
+            mIndex->Insert(victim, size);
+            return false;
+        }
+    }
+    return true;
+}
+
+void FileDataCache::PostMakeRoom() {
+    const auto self = shared_from_this();
+    mWriter->Post([self] { self->MakeRoom(nullptr, 0); });
+}
+
+void FileDataCache::Remove(const ImmutableString& inKey, const ImmutableString& inName) {
+    EntryKey key;
+    if (!MakeEntryKey(inKey, inName, key)) {
+        return;
+    }
+    {
+        MutexLock lock(mMutex);
+        DropPending(key);
+    }
+    RemoveFile(key);
+}
+
+void FileDataCache::RemoveFile(const EntryKey& inKey) {
+    mDirectory->Remove(inKey);
+    MutexLock lock(mMutex);
+    mIndex->Remove(inKey);
+}
+
+// --- Looking at the directory.
+
+/// False when nothing is known of the directory, so that nothing may be added to it.
+bool FileDataCache::LookIfItIsTime() {
+    std::size_t count = 0;
+    bool hasLooked = false;
+    {
+        MutexLock lock(mMutex);
+        count = mMaximumCount;
+        hasLooked = mHasLooked;
+    }
+    if (hasLooked && mWritesSinceLook < WritesBetweenLooks(count) &&
+        std::chrono::steady_clock::now() - mLastLook < kLookPeriod) {
+        return true;
+    }
+    return LookAtDirectory() || hasLooked;
+}
+
+bool FileDataCache::LookAtDirectory() {
+    std::vector<CacheDirectory::Found> files;
+    if (!mDirectory->ListAll(mIsClosed, files)) {
+        return false;
+    }
+    auto index = boost::make_shared<DirectoryIndex>();
+    index->Reserve(files.size());
+    std::set<std::string> names;
+    for (const CacheDirectory::Found& file : files) {
+        index->Insert(file.key, file.size);
+        if (names.size() < kMaximumKnownNames) {
+            names.emplace(file.key.Name());
+        }
+    }
+    mWritesSinceLook = 0;
+    mLastLook = std::chrono::steady_clock::now();
+    {
+        MutexLock lock(mMutex);
+        mIndex.swap(index);
+        mHasLooked = true;
+        if (mKnownNames.size() < kMaximumKnownNames) {
+            mKnownNames.merge(names);
+        }
+    }
+    MakeRoom(nullptr, 0);
+    return true;
+}
+
+void FileDataCache::PostLook() {
+    {
+        MutexLock lock(mMutex);
+        if (mHasLooked || mIsLookPosted) {
+            return;
+        }
+        mIsLookPosted = true;
+    }
+    const auto self = shared_from_this();
+    mWriter->Post([self] { self->LookIfItIsTime(); });
+}
+
+// --- Bounds.
+
+void FileDataCache::SetMaxFileCount(std::size_t inCount) {
+    MutexLock lock(mMutex);
+    mMaximumCount = std::max<std::size_t>(inCount, 1);
+    const bool isTooMuch = mIndex->Count() > mMaximumCount;
+    lock.Unlock();
+    if (isTooMuch) {
+        PostMakeRoom();
+    }
+}
+
+void FileDataCache::SetMaxByteCount(std::uint64_t inBytes) {
+    MutexLock lock(mMutex);
+    mMaximumBytes = inBytes;
+    const bool isTooMuch = mIndex->Bytes() > mMaximumBytes;
+    lock.Unlock();
+    if (isTooMuch) {
+        PostMakeRoom();
+    }
+}
+
+std::size_t FileDataCache::GetFileCount() const {
+    MutexLock lock(mMutex);
+    return mIndex->Count();
+}
+
+std::uint64_t FileDataCache::GetByteCount() const {
+    MutexLock lock(mMutex);
+    return mIndex->Bytes();
+}
+
+// --- The end.
+
+bool FileDataCache::WaitForWrites(std::uint32_t inMilliseconds) {
+    const auto end = std::chrono::steady_clock::now() + std::chrono::milliseconds(inMilliseconds);
+    MutexLock lock(mMutex);
+    while (!mPending.empty()) {
+        if (!mWritten.WaitUntil(lock, end) && !mPending.empty()) {
+            return false;
+        }
+    }
+    return true;
+}
+
+void FileDataCache::Close(std::uint32_t inMilliseconds) {
+    WaitForWrites(inMilliseconds);
+    mIsClosed = true;
+    mWriter->Stop();
+    mReaders->Wait(ostcore::threads::kForever);
+    MutexLock lock(mMutex);
+    mPending.clear();
+    mPendingBytes = 0;
+}
+
+}  // namespace detail
+}  // namespace QM
