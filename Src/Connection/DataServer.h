@@ -196,6 +196,7 @@ private:
 
     void InitFromDiscoveryURL(const Settings& inSettings);
     void UpdateLoginData() ZO_REQUIRES(IZOCDataServer::GetLock());
+    void EnableRetries();
     bool BecomeLoggedInServer();
     void OnRenewed(const Guid& inRequest, int inResult, const InterfaceRef<IZOCDataServer>& inServer);
     void ShowTokenLostIfNeeded();

@@ -6,6 +6,7 @@
 #include "Connection/ReconnectDialog.h"
 #include "Connection/RememberedLogin.h"
 #include "Frame/Station.h"
+#include "ostcore/debug/DebugDatabase.h"
 #include "ostnet/HeaderConstants.h"
 #include "Relations.h"
 #include "ZOClient/Messages.h"
@@ -57,12 +58,23 @@ bool DataServer::VerifyAuthentication(const shared_ptr<ostnet::Response>& inResp
     if (isInResponse) {
         TakeTokenFromResponse(inResponse);
     }
-    mChain.recoverableError->SetRetriesEnabled(true);
+    EnableRetries();
     if (mBecomeLoggedIn && BecomeLoggedInServer()) {
         RememberLogin(GetLoginData());
         PostLibraryMessage(ZOLoginMessage());
     }
     return true;
+}
+
+// Under the lock, so that the end of use, which turns them off, has the last word.
+void DataServer::EnableRetries() {
+    if (ostcore::debug::DebugDatabase::GetBool("ZOClient.DisableRetries", false)) {
+        return;
+    }
+    ScopedLock lock(IZOCDataServer::GetLock(), "DataServer::EnableRetries");
+    if (!mUseHasEnded) {
+        mChain.recoverableError->SetRetriesEnabled(true);
+    }
 }
 
 bool DataServer::BecomeLoggedInServer() {
@@ -123,11 +135,11 @@ void DataServer::ReleaseCaches() {
     locators.swap(mMediaLocatorCache);
     std::swap(user, mLoggedInUser);
     lock.Unlock();
+    mChain.cache->Purge();
 }
 
 void DataServer::EndUse() {
     ReleaseCaches();
-    mChain.recoverableError->SetRetriesEnabled(false);
     Guid renewal;
     shared_ptr<ReconnectDialog> dialog;
     {
@@ -138,6 +150,7 @@ void DataServer::EndUse() {
         renewal = mRenewal;
         dialog = mReconnectDialog;
     }
+    mChain.recoverableError->SetRetriesEnabled(false);
     CloseNetworkWarning();
     // A sign-in that is under way ends, and takes what is parked with it; what waits for the user ends here.
     CancelConnectRequest(renewal);

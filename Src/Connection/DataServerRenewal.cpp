@@ -195,6 +195,8 @@ bool DataServer::AdoptToken(const ImmutableString& inToken) {
     if (dialog) {
         dialog->CloseAsOvertaken();
     }
+    // A sign-in of this server that failed before has left them off.
+    EnableRetries();
     mChain.authorization->SetAuthToken(inToken);
     return true;
 }

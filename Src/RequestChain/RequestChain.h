@@ -2,8 +2,11 @@
 // requests enter.
 #pragma once
 
+#include "ostnet/http/CachingProcessor.h"
 #include "RequestChain/AuthorizationProcessor.h"
 #include "RequestChain/RecoverableErrorProcessor.h"
+#include "RequestChain/ThrottlingReadProcessor.h"
+#include "RequestChain/ThrottlingWriteProcessor.h"
 
 namespace ZOCL {
 
@@ -20,14 +23,18 @@ struct ChainCallbacks {
 ///  - `global`: every request; login and discovery enter here directly.
 ///  - `recoverableError`: every request of the verbs.
 ///  - `authorization`: the same; what is above it has no token yet.
-///  - `cache`: null when there is none.
-///  - `common`: where GET, HEAD and DELETE enter.
-///  - `upload`: where PUT and POST enter.
+///  - `readThrottle`: counts GET and HEAD, across replays and retries below it.
+///  - `cache`: joins equal reads and answers from memory; above the read throttle, as that needs no slot.
+///  - `writeThrottle`: counts PUT, POST and DELETE.
+///  - `common`: where GET, HEAD and DELETE enter; the write throttle.
+///  - `upload`: where PUT and POST enter when the server takes packed bodies; it packs the large ones.
 struct RequestChain {
     shared_ptr<ostnet::http::RequestProcessor> global;
     shared_ptr<RecoverableErrorProcessor> recoverableError;
     shared_ptr<AuthorizationProcessor> authorization;
-    shared_ptr<ostnet::http::RequestProcessor> cache;
+    shared_ptr<ThrottlingReadProcessor> readThrottle;
+    shared_ptr<ostnet::http::CachingProcessor> cache;
+    shared_ptr<ThrottlingWriteProcessor> writeThrottle;
     shared_ptr<ostnet::http::RequestProcessor> common;
     shared_ptr<ostnet::http::RequestProcessor> upload;
 };

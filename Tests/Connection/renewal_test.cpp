@@ -54,12 +54,15 @@ protected:
     void Ask(int inCount) {
         for (int i = 0; i < inCount; ++i) {
             ids.push_back(Guid::CreateUnique());
+            // Of one URL they would be one request.
+            const std::string path = "/assets/of-many-" + std::to_string(ids.size());
+            hub.AddRoute("GET", path, [](const RecordedRequest&) { return ScriptedAnswer::Status(200); });
             ASSERT_TRUE(server->GET(ids.back(),
                                     [this](const Guid&, const shared_ptr<ostnet::Response>& inResponse) {
                                         statuses[inResponse ? inResponse->status : -2]++;
                                         ++completed;
                                     },
-                                    kAssets, {}));
+                                    ImmutableString(hub.BaseURL() + path), {}));
         }
     }
     /// Runs the main thread until so many requests have completed.
