@@ -1,4 +1,4 @@
-// The data server's caches of live objects, for the floors that fill and clear them.
+// The data server's caches of live objects and of payloads, for the floors that fill and clear them.
 #pragma once
 
 #include "ZOClient/IZOCDataServer.h"
@@ -21,6 +21,10 @@ public:
     virtual InterfaceRef<IZOCMediaLocator> GetCachedMediaLocator(const ImmutableString& inID) = 0;
     virtual void ClearProductionFromCache(const ImmutableString& inURL) = 0;
     virtual void ClearMediaLocatorFromCache(const ImmutableString& inID) = 0;
+    /// Keeps a payload that this client has just written and the server knows by that content identifier, so
+    /// that it need not be fetched; the work is done on a worker.
+    virtual void CacheContent(const ImmutableString& inContentID,
+                              const shared_ptr<RecycledMemory const>& inPayload) = 0;
 };
 
 }  // namespace ZOCL

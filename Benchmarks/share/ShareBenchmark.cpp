@@ -263,6 +263,7 @@ int main() {
     const bench::HubProcess hub;
     setenv("ZOCLIENT_CONFIG_HOME", (hub.Directory() + "/config").c_str(), 1);
     setenv("ZOCLIENT_STATE_HOME", (hub.Directory() + "/state").c_str(), 1);
+    setenv("ZOCLIENT_CACHE_HOME", (hub.Directory() + "/cache").c_str(), 1);
     HLM::SetIsHeadless(true);
     Initialize();
     Run(hub);

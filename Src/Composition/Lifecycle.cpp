@@ -2,6 +2,7 @@
 // used after it has gone.
 #include "Collaboration/CollaborationResources.h"
 #include "Connection/AutoAuthentication.h"
+#include "Connection/ContentCache.h"
 #include "Frame/Station.h"
 #include "Frame/SyslogLogger.h"
 #include "Model/ModelResourceFactory.h"
@@ -49,6 +50,8 @@ void Shutdown() {
     GetCompositionRoot().resources = nullptr;
     GetCompositionRoot().collaboration = nullptr;
     GetCompositionRoot().polls = nullptr;
+    // After the network, whose last completions may still have stored something.
+    ReleaseContentCache();
     // Last, since whatever ran until here may have remembered something.
     RFL::CloseRegistry();
 }

@@ -4,8 +4,11 @@
 #include <atomic>
 #include <unordered_map>
 
+#include "Connection/ContentReads.h"
 #include "Connection/ServiceDocument.h"
 #include "ostcore/threads/Scheduler.h"
+#include "ostnet/http/ExpiringEntryMap.h"
+#include "QM/DataCache.h"
 #include "RequestChain/RequestChain.h"
 #include "ResourceCaches.h"
 #include "ZOClient/IZOCDataServer.h"
@@ -156,7 +159,7 @@ public:
     void ClearProductionFromCache(const ImmutableString& inURL) override;
     void ClearMediaLocatorFromCache(const ImmutableString& inID) override;
 
-    // --- IZOCDataServer, verbs (DataServerVerbs.cpp).
+    // --- IZOCDataServer, verbs (DataServerVerbs.cpp, those by content in DataServerContent.cpp).
 
     using Completion = ostnet::http::CompletionFunction;
     using Payload = shared_ptr<RecycledMemory const>;
@@ -188,10 +191,34 @@ public:
                              std::uint32_t) override;
     ResponseRef BlockingDELETE(const ImmutableString&, ostnet::Headers, std::uint32_t) override;
 
+    // --- Payloads that are kept (DataServerContent.cpp).
+
+    /// Gets the inflated payload in a 200 response, or null when the cache could not give it.
+    using ContentCompletion = function<void(const ResponseRef&)>;
+
+    /// kResultContentAvailable: outResponse is set, and the completion is not called. kResultContentPending:
+    /// the completion is called once, on a worker. A failure: the cache does not hold it.
+    int GetCachedContent(const ImmutableString& inContentID, const ContentCompletion& inCompletion,
+                         ResponseRef& outResponse, bool inImmediately);
+    /// Null when the cache does not hold it or the time, in milliseconds, passed first. Blocks on the disk.
+    ResponseRef GetCachedContentSynchronous(const ImmutableString& inContentID,
+                                            std::uint32_t inTimeoutMilliseconds);
+    /// Keeps what a 2xx answer brought. Returns it inflated as a 200 without headers, 417 for a body that
+    /// does not inflate, which is not kept, and any other answer as it is.
+    ResponseRef CacheAndDecompressContent(const ImmutableString& inContentID, const ResponseRef& inResponse);
+    void CacheContent(const ImmutableString& inContentID, const Payload& inPayload) override;
+
 private:
     class Anchor;
+    using ContentMap = ostnet::http::ExpiringEntryMap<ImmutableString, ResponseRef>;
+    struct StoredContent {
+        ImmutableString contentID;
+        ImmutableString name;
+        shared_ptr<QM::DataCache> cache;
+        ContentCompletion completion;
+    };
 
-    DataServer() = default;
+    DataServer();
     ~DataServer() override;
 
     void InitFromDiscoveryURL(const Settings& inSettings);
@@ -220,6 +247,19 @@ private:
     InterfaceRef<IZOCProductionList> MakeProductionList(const ImmutableString& inRelation);
     ResponseRef WaitForResponse(std::uint32_t inTimeoutMilliseconds,
                                 const function<bool(const Guid&, const Completion&)>& inStart);
+    int GetSimplyCachedContent(const ImmutableString& inContentID, ResponseRef& outResponse);
+    int GetStoredContent(const ImmutableString& inContentID, const ContentCompletion& inCompletion,
+                         ResponseRef& outResponse, bool inImmediately);
+    int UseHeldContent(const StoredContent& inContent, const Payload& inStored, ResponseRef& outResponse);
+    int UseHeldContentLater(const StoredContent& inContent, const Payload& inStored);
+    void OnGetCachedContentComplete(const StoredContent& inContent, const Payload& inStored);
+    static void DropContent(const StoredContent& inContent);
+    void CacheSimply(const ImmutableString& inContentID, const ResponseRef& inResponse);
+    bool RequestContent(const ImmutableString& inContentID, const Guid& inRequestID,
+                        const Completion& inCompletion, const ImmutableString& inURL);
+    void OnContentFromCache(const ImmutableString& inContentID, const Guid& inRequestID,
+                            const Completion& inCompletion, const ImmutableString& inURL,
+                            const ResponseRef& inResponse);
     InterfaceRef<IZOCDataServer> Self() { return InterfaceRef<IZOCDataServer>(this); }
 
     std::atomic<std::uint32_t> mReferences{0};
@@ -231,6 +271,10 @@ private:
     bool mSecure = false;
     bool mBecomeLoggedIn = true;
     RequestChain mChain;
+    const bool mUseSimpleContentCache;
+    /// Null unless it is used.
+    const shared_ptr<ContentMap> mSimpleContentCache;
+    ContentReads mContentReads;
 
     ServiceDocument::Description mDescription ZO_GUARDED_BY(IZOCDataServer::GetLock());
     LinkTable mRootLinks ZO_GUARDED_BY(IZOCDataServer::GetLock());

@@ -23,6 +23,9 @@ Headers WithIdempotencyKey(Headers inHeaders, const Guid& inRequestID) {
 }  // namespace
 
 void DataServer::TryToCancelRequest(const Guid& inRequestID) {
+    if (mContentReads.Cancel(inRequestID)) {
+        return;
+    }
     mChain.upload->TryToCancelRequest(inRequestID);
 }
 
@@ -82,11 +85,6 @@ bool DataServer::PUT(const Guid& inRequestID, const Completion& inCompletion, co
     return !url.IsNull() &&
            entry->PUT(inRequestID, inCompletion, url, WithIdempotencyKey(std::move(inHeaders), inRequestID),
                       inForm, RequestOptions());
-}
-
-bool DataServer::GETByContentID(const ImmutableString&, const Guid& inRequestID,
-                                const Completion& inCompletion, const ImmutableString& inURL) {
-    return GET(inRequestID, inCompletion, inURL, Headers());
 }
 
 DataServer::ResponseRef DataServer::WaitForResponse(
@@ -159,12 +157,6 @@ DataServer::ResponseRef DataServer::BlockingPUT(const ImmutableString& inURL, He
                            [&](const Guid& inRequestID, const Completion& inCompletion) {
                                return PUT(inRequestID, inCompletion, inURL, inHeaders, inForm);
                            });
-}
-
-DataServer::ResponseRef DataServer::BlockingGETByContentID(const ImmutableString&,
-                                                           const ImmutableString& inURL,
-                                                           std::uint32_t inTimeoutMilliseconds) {
-    return BlockingGET(inURL, Headers(), inTimeoutMilliseconds);
 }
 
 }  // namespace ZOCL

@@ -3,6 +3,7 @@
 #include "Model/ResourceCreation.h"
 #include "ostnet/HeaderConstants.h"
 #include "ostnet/http/RequestProcessor.h"
+#include "ResourceCaches.h"
 #include "ZOClient/CompoundAsyncOperation.h"
 
 namespace ZOCL {
@@ -28,6 +29,25 @@ void StartAllPayloads(const shared_ptr<CompoundAsyncOperation>& inOperation,
             },
             nullptr);
     }
+}
+
+/// Keeps the payload of a new enclosure under the identifier that the server gave it, so that it need not be
+/// fetched when it is asked for.
+RequestCompletion KeepingPayload(const InterfaceRef<IZOCDataServer>& inServer,
+                                 const shared_ptr<RecycledMemory const>& inPayload,
+                                 const RequestCompletion& inCompletion) {
+    return [inServer, inPayload, inCompletion](const Guid& inRequestID, int inResult,
+                                               const InterfaceRef<IZOCServerResource>& inResource,
+                                               const shared_ptr<ostnet::Response>& inResponse) {
+        const auto enclosure = RFL::QueryInterface<IZOCEnclosure>(inResource);
+        const auto caches = RFL::QueryInterface<ResourceCaches>(inServer);
+        if (inResult >= 0 && enclosure && caches) {
+            caches->CacheContent(enclosure->GetEnclosureContentID(), inPayload);
+        }
+        if (inCompletion) {
+            inCompletion(inRequestID, inResult, inResource, inResponse);
+        }
+    };
 }
 
 bool LoadFoundEnclosure(const InterfaceRef<IZOCEnclosures>& inEnclosures, const ImmutableString& inName,
@@ -68,8 +88,10 @@ bool CreateEnclosureOfType(const Guid& inRequestID, const ImmutableString& inFac
     ostnet::Headers headers;
     ostnet::http::SetFormContentTypeHeader(form, headers);
     const auto factory = ServerResource::MakePlain(inFactoryURL, inServer, ResourceWritability::kReadOnly);
-    return factory->Post(ostnet::http::CompleteForm(form), headers, inRequestID,
-                         MakeCreationCompletion<Enclosure>(inFactoryURL, factory->GetServer(), inCompletion));
+    return factory->Post(
+        ostnet::http::CompleteForm(form), headers, inRequestID,
+        MakeCreationCompletion<Enclosure>(inFactoryURL, factory->GetServer(),
+                                          KeepingPayload(factory->GetServer(), inPayload, inCompletion)));
 }
 
 bool LoadAllEnclosures(const InterfaceRef<IZOCEnclosures>& inEnclosures, const Guid& inRequestID,

@@ -11,6 +11,7 @@
 #include <gtest/gtest.h>
 
 #include "Collaboration/CollaborationResources.h"
+#include "Connection/ContentCache.h"
 #include "Connection/DataServer.h"
 #include "Connection/ServiceDocument.h"
 #include "dto/TransferStructure.h"
@@ -102,6 +103,7 @@ private:
 class ClientTest : public testing::Test {
 protected:
     explicit ClientTest(std::size_t inWorkers = 2) : net(inWorkers) {
+        ReplaceContentCache(QM::CreateDataCacheInMemory());
         GetCompositionRoot().resources = GetModelResourceFactory();
         GetCompositionRoot().collaboration = GetCollaborationFactory();
         mFormerSink = ostcore::debug::SetTraceSink([this](const std::string& inLine) {

@@ -33,13 +33,14 @@ inline pid_t Spawn(const std::vector<std::string>& inArguments, int inOutput) {
     return child;
 }
 
-/// A hub with the user anna, and more when asked, on a free port, in a directory that goes with it. The
-/// password of a user is the name followed by "s-secret".
+/// A hub with the user anna, and more when asked, on a free port, in a directory that goes with it; payloads
+/// that this process keeps go there too. The password of a user is the name followed by "s-secret".
 class RunningHub {
 public:
     RunningHub() {
         std::string pattern = (std::filesystem::temp_directory_path() / "zoclient-hub-XXXXXX").string();
         mDirectory = mkdtemp(pattern.data());
+        setenv("ZOCLIENT_CACHE_HOME", (mDirectory + "/cache").c_str(), 1);
         AddUser("anna");
         Start();
     }
@@ -77,6 +78,9 @@ public:
             mProcess = -1;
         }
     }
+
+    /// Stops it and lets it go on.
+    void Signal(int inSignal) const { kill(mProcess, inSignal); }
 
     ImmutableString URL() const { return ImmutableString(mURL); }
     const std::string& Directory() const { return mDirectory; }

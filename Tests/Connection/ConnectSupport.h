@@ -14,6 +14,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include "Connection/ContentCache.h"
 #include "Connection/DataServer.h"
 #include "Connection/LoggedInServer.h"
 #include "HLM/HLM.h"
@@ -99,6 +100,7 @@ protected:
             setenv(variable, (mDirectory + "/state").c_str(), 1);
         }
         setenv("ZOCLIENT_MACHINE_CONFIG", (mDirectory + "/machine.sqlite").c_str(), 1);
+        ReplaceContentCache(QM::CreateDataCacheInMemory());
         RFL::CloseRegistry();
         Registry::ResetIsZOEnabled();
         HLM::SetIsHeadless(false);

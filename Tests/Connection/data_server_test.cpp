@@ -83,7 +83,9 @@ TEST_F(DataServerTest, EachBlockingVerbBringsItsAnswer) {
     const auto payload = RecycledMemory::CreateFromBytes("-body");
     const ostnet::http::Form form{{ImmutableString("f"), "-field"}};
     EXPECT_EQ(server->BlockingGET(kAssets, {}, kWaitForever)->GetPayloadAsUTF8String(), "GET");
-    EXPECT_EQ(server->BlockingGETByContentID(ImmutableString("c"), kAssets, kWaitForever)->status, 201);
+    const auto content = server->BlockingGETByContentID(ImmutableString("c"), kAssets, kWaitForever);
+    EXPECT_EQ(content->status, 200);
+    EXPECT_EQ(content->GetPayloadAsUTF8String(), "GET");
     EXPECT_EQ(server->BlockingHEAD(kAssets, {}, kWaitForever)->status, 201);
     EXPECT_EQ(server->BlockingPUT(kAssets, {}, payload, kWaitForever)->GetPayloadAsUTF8String(), "PUT-body");
     const auto put = server->BlockingPUT(kAssets, {}, form, kWaitForever);

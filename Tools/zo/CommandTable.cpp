@@ -331,6 +331,7 @@ const std::vector<EnvironmentVariable>& EnvironmentVariables() {
         {"ZOCLIENT_ZOHUB", "The program that 'zo hub start' starts."},
         {"ZOCLIENT_CONFIG_HOME, ZOCLIENT_STATE_HOME",
          "Where registry and zo.conf, and where state and the hub's data lie; else the XDG directories."},
+        {"ZOCLIENT_CACHE_HOME", "Where payloads are kept that were fetched before; else the XDG directory."},
         {"NO_COLOR", "When set and not empty: no colours, unless --color always."},
         {"COLUMNS", "The width of the terminal, when it cannot be asked."},
     };

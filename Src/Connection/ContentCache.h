@@ -1,0 +1,31 @@
+// The one cache of payloads of the process: in memory, with files behind it that outlive the process.
+#pragma once
+
+#include "QM/DataCache.h"
+#include "ZOClient/ContentCache.h"
+
+namespace ZOCL {
+
+/// The cache, built at first use over the directory that the environment names then; null when there is no
+/// base directory. Threads: any.
+shared_ptr<QM::DataCache> GetContentCache();
+
+/// Lets it go: what was accepted is written, for some seconds at most. Data servers that live on use what the
+/// next GetContentCache builds. Not from a completion.
+void ReleaseContentCache();
+
+/// Puts another in its place, null for none, for tests.
+void ReplaceContentCache(const shared_ptr<QM::DataCache>& inCache);
+
+/// The name under which payloads are stored, as gzip.
+const ImmutableString& ContentName();
+
+/// Keeps a payload that this library itself has written: packs and stores it on a worker, unless it is there
+/// already. What is empty is not kept.
+void CacheContentLater(const ImmutableString& inContentID, const shared_ptr<RecycledMemory const>& inPayload,
+                       const function<bool(const function<void()>&)>& inPost);
+/// The work of it, on the calling thread.
+void CompressAndCacheContent(const ImmutableString& inContentID,
+                             const shared_ptr<RecycledMemory const>& inPayload);
+
+}  // namespace ZOCL
