@@ -28,6 +28,9 @@ public:
     static const BindingTable& Table();
 
     ImmutableString TransactionType() const { return String("transactionType"); }
+    /// In the title of a commit alone: the request that made it.
+    std::string_view RequestID() const { return Text(kRequestID); }
+    static constexpr const char* kRequestID = "requestID";
 };
 
 class Production : public TransferStructure<Production> {
@@ -40,6 +43,7 @@ public:
     ImmutableString Identifier() const;
     ImmutableString ParentIdentifier() const { return String("zo:parentProductionId"); }
     ImmutableString CommitID() const { return String("zo:commitId", "commitId"); }
+    ImmutableString BaseCommitID() const { return String("zo:baseCommitId"); }
     ImmutableString Owner() const { return String("zo:owner", "owner"); }
     ptime Created() const { return Date("created"); }
     ptime Modified() const { return Date("modified"); }

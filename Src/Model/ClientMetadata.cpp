@@ -89,10 +89,12 @@ ClientMetadata ReadClientMetadata(const dto::ClientMetadata& inBody) {
     return metadata;
 }
 
-std::string MakeCommitTitle(const UString& inMessage, const JSONValue& inMetadata) {
+std::string MakeCommitTitle(const UString& inMessage, const JSONValue& inMetadata, const Guid& inRequestID) {
+    JSONValue metadata = inMetadata;
+    AddToObject(metadata, dto::ClientMetadata::kRequestID, inRequestID.ToString());
     JSONValue title = JSONValue::EmptyObject();
     AddToObject(title, "commitMessage", inMessage);
-    AddToObject(title, "metadata", inMetadata);
+    AddToObject(title, "metadata", metadata);
     return ostcore::serialization::GetJSONUTF8String(title);
 }
 

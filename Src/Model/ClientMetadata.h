@@ -15,7 +15,8 @@ ostcore::serialization::JSONValue MakeClientMetadataBody(const ClientMetadata& i
 ClientMetadata ReadClientMetadata(const dto::ClientMetadata& inBody);
 
 /// The title of the commit that a transaction becomes: the text of an object that holds the message and who
-/// made the transaction.
-std::string MakeCommitTitle(const UString& inMessage, const ostcore::serialization::JSONValue& inMetadata);
+/// made the transaction. The request that commits is named in it, so that its commit can be told from others.
+std::string MakeCommitTitle(const UString& inMessage, const ostcore::serialization::JSONValue& inMetadata,
+                            const Guid& inRequestID);
 
 }  // namespace ZOCL

@@ -1,6 +1,7 @@
 // What a session tells of its surroundings, and how it is shared and brought up to date.
 #include "CollaborationFactory.h"
 #include "Model/DataServerCaches.h"
+#include "Model/OwnCommit.h"
 #include "Model/Production.h"
 #include "Model/ProductionList.h"
 #include "Model/ResourceCreation.h"
@@ -8,6 +9,7 @@
 #include "ostcore/debug/Trace.h"
 #include "ostcore/utility/StringConversion.h"
 #include "Relations.h"
+#include "RequestChain/RepeatMark.h"
 #include "ResourceFactory.h"
 
 namespace ZOCL {
@@ -73,6 +75,10 @@ void Production::SetCreationContext(const InterfaceRef<Production>& inParent,
     lock.Unlock();
 }
 
+ImmutableString Production::GetBaseCommit() {
+    return GetBody("Production::GetBaseCommit").BaseCommitID();
+}
+
 InterfaceRef<IZOCProduction> Production::GetParentProduction() {
     {
         ScopedLock lock(IZOCDataServer::GetLock(), "Production::GetParentProduction");
@@ -103,7 +109,34 @@ bool Production::Push(const Guid& inRequestID, const RequestCompletion& inComple
     AddUnlessEmpty(form, kField_CommitMessage, inCommitMessage);
     AddUnlessEmpty(form, kField_CommitID, inCommitId);
     form.emplace_back(kField_ResolveStrategy, ResolveStrategyText(inResolveStrategy));
-    return PostStrategyForm(kRelation_Sessions_Session_Push, form, inRequestID, inCompletion);
+    return PostStrategyForm(kRelation_Sessions_Session_Push, form, inRequestID,
+                            MakePushCompletion(inCommitMessage, inCommitId, inCompletion));
+}
+
+RequestCompletion Production::MakePushCompletion(const UString& inMessage, const UString& inCommitID,
+                                                 const RequestCompletion& inCompletion) {
+    const ImmutableString stated(ToUTF8(inCommitID));
+    const ShareAttempt attempt{stated.empty() ? GetLoadedRevision() : stated, inMessage};
+    return [self = InterfaceRef<Production>(this), attempt, inCompletion](
+               const Guid& inID, int inResult, const InterfaceRef<IZOCServerResource>& inResource,
+               const shared_ptr<ostnet::Response>& inResponse) {
+        if (!inCompletion) {
+            return;
+        }
+        if (!IsRefusedRepetition(inResponse)) {
+            inCompletion(inID, inResult, inResource, inResponse);
+            return;
+        }
+        FindOwnShare(
+            self->GetHTTPURL(), self->GetServer(), attempt,
+            [=](const InterfaceRef<Production>& inSession, const shared_ptr<ostnet::Response>& inAnswer) {
+                if (inSession) {
+                    inCompletion(inID, kResultSuccess, inSession, inAnswer);
+                } else {
+                    inCompletion(inID, inResult, inResource, inResponse);
+                }
+            });
+    };
 }
 
 bool Production::Pull(const Guid& inRequestID, const RequestCompletion& inCompletion, int inMergeStrategy,

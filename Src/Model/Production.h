@@ -102,6 +102,8 @@ public:
 
     // --- For code of this floor.
 
+    /// The shared commit on which a session stands; null when the server gave none.
+    ImmutableString GetBaseCommit();
     /// Tells a session of the production that made it, and a transaction of its session and the list in which
     /// it stands; the list is null for a session.
     void SetCreationContext(const InterfaceRef<Production>& inParent,
@@ -126,6 +128,10 @@ private:
     bool PostStrategyForm(const ImmutableString& inRelation, const ostnet::http::Form& inForm,
                           const Guid& inRequestID, const RequestCompletion& inCompletion);
 
+    /// A refusal goes to the host, unless it meets a share that went through before.
+    RequestCompletion MakePushCompletion(const UString& inMessage, const UString& inCommitID,
+                                         const RequestCompletion& inCompletion);
+
     struct TransactionRequest;
     bool GetOrCreateTransactionFactory(const shared_ptr<TransactionRequest>& inRequest);
     bool CreateTransactionFactory(const shared_ptr<TransactionRequest>& inRequest);
@@ -140,6 +146,9 @@ private:
     RequestCompletion MakeNewAssetCompletion(const RequestCompletion& inCompletion);
     void OnCommitted(const Guid& inRequestID, int inResult, const shared_ptr<ostnet::Response>& inResponse,
                      const RequestCompletion& inCompletion);
+    void OnRepeatedCommitRefused(const Guid& inRequestID, int inResult,
+                                 const shared_ptr<ostnet::Response>& inResponse,
+                                 const RequestCompletion& inCompletion);
     void ClearCachedState();
     void LeaveListOfParent();
     PropertyChanges TakePropertyChanges();

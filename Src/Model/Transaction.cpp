@@ -4,6 +4,7 @@
 #include "Model/AssetProperties.h"
 #include "Model/ClientMetadata.h"
 #include "Model/DataServerCaches.h"
+#include "Model/OwnCommit.h"
 #include "Model/Production.h"
 #include "Model/ResourceCreation.h"
 #include "Model/ServerResourceWithEnclosures.h"
@@ -11,6 +12,7 @@
 #include "ostcore/debug/Trace.h"
 #include "ostcore/utility/StringConversion.h"
 #include "Relations.h"
+#include "RequestChain/RepeatMark.h"
 
 namespace ZOCL {
 
@@ -132,13 +134,29 @@ bool Production::Commit(const Guid& inRequestID, const RequestCompletion& inComp
     const bool isIngest = metadata.TransactionType() == kTransactionType_Ingest;
     JSONValue commit = JSONValue::EmptyObject();
     AddToObject(commit, kKey_ResolveStrategy, isIngest ? "AUTO" : "NONE");
-    AddToObject(commit, kKey_CommitMessage, MakeCommitTitle(inMessage, metadata.Body()));
+    AddToObject(commit, kKey_CommitMessage, MakeCommitTitle(inMessage, metadata.Body(), inRequestID));
     const InterfaceRef<Production> self(this);
     return PostJSON(
         link, GetServer(), commit, inRequestID,
         [self, inCompletion](const Guid& inID, int inResult, const InterfaceRef<IZOCServerResource>&,
                              const shared_ptr<ostnet::Response>& inResponse) {
-            self->OnCommitted(inID, inResult, inResponse, inCompletion);
+            if (IsRefusedRepetition(inResponse)) {
+                self->OnRepeatedCommitRefused(inID, inResult, inResponse, inCompletion);
+            } else {
+                self->OnCommitted(inID, inResult, inResponse, inCompletion);
+            }
+        });
+}
+
+void Production::OnRepeatedCommitRefused(const Guid& inRequestID, int inResult,
+                                         const shared_ptr<ostnet::Response>& inResponse,
+                                         const RequestCompletion& inCompletion) {
+    const InterfaceRef<Production> self(this);
+    FindOwnCommit(
+        GetParentLink(), GetServer(), inRequestID,
+        [=](const InterfaceRef<Production>& inSession, const shared_ptr<ostnet::Response>& inAnswer) {
+            self->OnCommitted(inRequestID, inSession ? kResultSuccess : inResult,
+                              inSession ? inAnswer : inResponse, inCompletion);
         });
 }
 

@@ -165,7 +165,7 @@ const BindingTable& ClientMetadata::Table() {
         {"applicationName", Kind::OptionalString},       {"applicationBuildNumber", Kind::OptionalString},
         {"applicationInstanceID", Kind::OptionalString}, {"machineID", Kind::OptionalString},
         {"machineName", Kind::OptionalString},           {"machineIP", Kind::OptionalString},
-        {"transactionType", Kind::OptionalString},
+        {"transactionType", Kind::OptionalString},       {kRequestID, Kind::OptionalString},
     };
     return table;
 }
@@ -178,6 +178,7 @@ const BindingTable& Production::Table() {
         {"zo:parentProductionId", Kind::OptionalString},
         {"zo:commitId", Kind::OptionalString},
         {"commitId", Kind::OptionalString},
+        {"zo:baseCommitId", Kind::OptionalString},
         {"properties", Kind::Object, &ProductionBaseProperties::Table},
         {"zo:owner", Kind::OptionalString},
         {"owner", Kind::OptionalString},

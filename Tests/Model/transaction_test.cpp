@@ -132,8 +132,10 @@ TEST_F(TransactionTest, CommitSendsATitleThatIsReadBackAndRefreshesTheSession) {
     const auto body = ostcore::serialization::JSONParse(std::string_view(Last("POST", "/t1/commit").body));
     EXPECT_EQ(ostcore::serialization::JSONView(body).Find(":resolveStrategy").AsString(), "NONE");
     const std::string title(ostcore::serialization::JSONView(body).Find(":commitMessage").AsString());
-    EXPECT_EQ(title, Quote("{'commitMessage':'say \\") + Quote("'\xC3\xA9\\") + Quote("'','metadata':") +
-                         Quote(kEdit) + "}");
+    EXPECT_EQ(title,
+              Quote("{'commitMessage':'say \\") + Quote("'\xC3\xA9\\") + Quote("'','metadata':") +
+                  Quote("{'applicationName':'Host','transactionType':'edit','extra':'x','requestID':'" +
+                        id.ToString() + "'}}"));
     CommitMetadata metadata;
     ASSERT_TRUE(GetCommitMetadataFromTitle(ostcore::utility::ToUTF16(title), metadata));
     EXPECT_EQ(metadata.commitMessage, u"say \"\u00e9\"");
