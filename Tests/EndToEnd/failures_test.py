@@ -78,6 +78,8 @@ class Failures(EndToEndTest):
     def test_statuses_of_a_hub(self):
         hub = self.fake()
         ada = self.user()
+        # What a hub that fails for good is worth, without the patience that it is met with.
+        ada.environment["ZOCLIENT_DEBUG_ZOClient_DisableRetries"] = "true"
         self.ends(self.login(ada, hub.url), OK)
         for status, code in ((401, NOT_AUTHENTICATED), (403, NOT_PERMITTED), (404, NOT_FOUND), (409, BEHIND),
                              (410, NOT_FOUND), (412, CHANGED), (500, FAILURE), (418, FAILURE)):

@@ -2,6 +2,7 @@
 #include "Context.h"
 
 #include <algorithm>
+#include <utility>
 
 #include "Failure.h"
 #include "HLM/HLM.h"
@@ -12,6 +13,7 @@
 #include "ServerAddress.h"
 #include "StoredToken.h"
 #include "ZOClient/Library.h"
+#include "ZOClient/Messages.h"
 
 #ifndef ZO_VERSION
 #define ZO_VERSION "0"
@@ -32,10 +34,15 @@ std::string FirstOf(std::initializer_list<std::optional<std::string>> inPlaces) 
 
 }  // namespace
 
-Library::Library(MainLoop& inLoop) : mLoop(inLoop) {
+Library::Library(MainLoop& inLoop, Output& ioOutput) : mLoop(inLoop), mOutput(ioOutput) {
     HLM::SetIsHeadless(true);
+    HLM::SetWaitsForNetwork(mOutput.HasPerson());
     // A login that is lost ends the verb's own requests, and with them the verb, by its exit code.
-    HLM::SetEndProcessFunction([] {});
+    HLM::SetEndProcessFunction([this] {
+        if (mNetworkIsDown) {
+            mLoop.GiveUpNetwork();
+        }
+    });
     // What the library calls fatal is told by the verb in its own words. Who wants traces has asked for them.
     if (!ostcore::debug::TraceEnabled("zo", ostcore::debug::kTraceLevel_Error)) {
         ostcore::debug::SetTraceLevel("*", ostcore::debug::kTraceLevel_Off);
@@ -43,13 +50,31 @@ Library::Library(MainLoop& inLoop) : mLoop(inLoop) {
     ostcore::config::SetClientName("zo");
     ostcore::config::SetClientBuildNumber(ZO_VERSION);
     ZOCL::Initialize();
+    mListener = std::make_unique<RFL::Listener>(ZOCL::GetStationID());
+    mListener->AddHandler<ZOCL::ZONetworkStateMessage>(
+        [this](const ZOCL::ZONetworkStateMessage& inMessage) { OnNetworkState(inMessage.isDown); });
     ostui::TerminalSettings terminal;
+    if (!mOutput.HasPerson()) {
+        terminal.input = -1;  // no terminal: nothing is asked
+    }
     terminal.isInterrupted = [this] { return mLoop.IsInterrupted(); };
     ostui::SetBackEnd(ostui::CreateTerminalBackEnd(terminal));
 }
 
+void Library::OnNetworkState(bool inIsDown) {
+    if (std::exchange(mNetworkIsDown, inIsDown) == inIsDown) {
+        return;
+    }
+    mOutput.Note(!inIsDown ? "the hub is back"
+                 : mOutput.HasPerson()
+                     ? "the hub cannot be reached; waiting until it is back (Ctrl-C ends it)"
+                     : "the hub cannot be reached; trying for 15 seconds");
+}
+
 Library::~Library() {
     mLoop.Drain();
+    mListener.reset();
+    HLM::SetEndProcessFunction({});
     ostui::SetBackEnd(nullptr);
     ZOCL::IZOCDataServer::Terminate(false);
     ZOCL::Shutdown();
@@ -66,7 +91,7 @@ const Configuration& Context::Settings() {
 
 void Context::StartLibrary() {
     if (!mLibrary) {
-        mLibrary = std::make_unique<Library>(mLoop);
+        mLibrary = std::make_unique<Library>(mLoop, mOutput);
     }
 }
 

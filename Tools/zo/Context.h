@@ -8,6 +8,7 @@
 #include "Configuration.h"
 #include "MainLoop.h"
 #include "Output.h"
+#include "RFL/Messaging.h"
 #include "State.h"
 
 namespace zo {
@@ -26,15 +27,22 @@ struct Target {
 
 /// The library while it runs: started as a headless host, ended when this object goes away, with nothing of
 /// it left in flight.
+///
+/// With a person before it zo waits for a hub that is away; else it gives up after the library's 15 seconds.
 class Library {
 public:
-    explicit Library(MainLoop& inLoop);
+    Library(MainLoop& inLoop, Output& ioOutput);
     ~Library();
     Library(const Library&) = delete;
     Library& operator=(const Library&) = delete;
 
 private:
+    void OnNetworkState(bool inIsDown);
+
     MainLoop& mLoop;
+    Output& mOutput;
+    bool mNetworkIsDown = false;
+    std::unique_ptr<RFL::Listener> mListener;
 };
 
 /// Main thread only.

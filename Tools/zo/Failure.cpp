@@ -49,6 +49,14 @@ std::string ReasonFor(ExitCode inCode, int inResult, const boost::shared_ptr<ost
 
 }  // namespace
 
+std::string HintAfterLostAnswer(int inResult, const boost::shared_ptr<ostnet::Response>& inResponse) {
+    return ExitCodeFor(inResult, inResponse) == ExitCode::Network
+               ? "it may have arrived all the same: look with 'zo history' once the hub is back, before it "
+                 "is "
+                 "done again"
+               : "";
+}
+
 Failure Failure::OfRequest(const std::string& inWhatWasTried, int inResult,
                            const boost::shared_ptr<ostnet::Response>& inResponse, std::string inHint) {
     const ExitCode code = ExitCodeFor(inResult, inResponse);

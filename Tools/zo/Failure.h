@@ -9,6 +9,9 @@
 
 namespace zo {
 
+/// What to do after a change whose answer did not come; empty for all other ends.
+std::string HintAfterLostAnswer(int inResult, const boost::shared_ptr<ostnet::Response>& inResponse);
+
 /// Ends the verb. The message says what was tried and on what, the hint what to do next. Copies share what it
 /// says, so that copying one in flight cannot throw.
 class Failure : public std::runtime_error {

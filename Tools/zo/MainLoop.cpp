@@ -5,6 +5,7 @@
 #include <memory>
 
 #include "Failure.h"
+#include "ostcore/threads/Executor.h"
 #include "ostcore/threads/MainThread.h"
 
 namespace zo {
@@ -12,6 +13,17 @@ namespace {
 
 constexpr std::uint32_t kForEver = 0xFFFFFFFFu;
 constexpr std::int64_t kLongestTurn = 60000;
+/// The transport engine's number for a connection that is refused (libcurl-errors(3)).
+constexpr int kCouldNotConnect = 7;
+
+Outcome UnreachableHub() {
+    Outcome outcome;
+    outcome.started = true;
+    outcome.result = ZOCL::kResultNoHTTPResponse;
+    outcome.response = boost::make_shared<ostnet::Response>(ostnet::Response::kStatusNoResponse);
+    outcome.response->curlError = kCouldNotConnect;
+    return outcome;
+}
 
 }  // namespace
 
@@ -36,8 +48,9 @@ void MainLoop::Launch(const StartFunction& inStart, const CancelFunction& inCanc
                                  const boost::shared_ptr<ostnet::Response>& inResponse) {
         const Outcome outcome{true, inResult, inResponse, inResource};
         ostcore::threads::AsyncCallFromMainThread([this, call, done, outcome] {
-            mInFlight.erase(call);
-            (*done)(outcome);
+            if (mInFlight.erase(call) > 0) {
+                (*done)(outcome);
+            }
         });
     };
     if (!inStart(request, onCompleted)) {
@@ -59,11 +72,25 @@ Outcome MainLoop::Run(const StartFunction& inStart, const CancelFunction& inCanc
 }
 
 Outcome MainLoop::RunToEnd(const StartFunction& inStart) {
+    if (mNetworkIsGivenUp) {
+        return UnreachableHub();
+    }
     Outcome outcome;
     Launch(
         inStart, [](const ZOCL::Guid&) {}, [&outcome](const Outcome& inOutcome) { outcome = inOutcome; });
     PumpUntilIdle();
-    return outcome;
+    return mNetworkIsGivenUp ? UnreachableHub() : outcome;
+}
+
+void MainLoop::RunBlocking(const std::function<void()>& inFunction) {
+    Run(
+        [&inFunction](const ZOCL::Guid& inRequest, const ZOCL::RequestCompletion& inCompletion) {
+            return ostcore::threads::GetIOBoundExecutor()->Post([inFunction, inRequest, inCompletion] {
+                inFunction();
+                inCompletion(inRequest, ZOCL::kResultSuccess, nullptr, nullptr);
+            });
+        },
+        [](const ZOCL::Guid&) { ZOCL::IZOCDataServer::Terminate(false); });
 }
 
 bool MainLoop::WaitUntil(const std::function<bool()>& inCondition, std::chrono::milliseconds inTime) {
@@ -112,6 +139,18 @@ void MainLoop::ThrowIfInterrupted() const {
     if (mInterrupt.IsRequested()) {
         throw Failure(ExitCode::Cancelled, "cancelled");
     }
+    if (mNetworkIsGivenUp) {
+        throw Failure(
+            ExitCode::Network,
+            "the hub could not be reached, or answered with errors alone, for more than 15 seconds",
+            "check that the hub runs ('zo hub status' for a local one), then try again; 'zo status' and "
+            "'zo history' tell whether a change had arrived");
+    }
+}
+
+void MainLoop::GiveUpNetwork() {
+    mNetworkIsGivenUp = true;
+    mInFlight.clear();
 }
 
 void MainLoop::Drain() {

@@ -30,6 +30,7 @@ using OutcomeFunction = std::function<void(const Outcome&)>;
 /// verbs need no locks. One function waits for everything that was started.
 ///
 /// An interrupt cancels all calls in flight, once; they still complete, and Wait returns when they have.
+/// When the network is given up, nothing is waited for any more, and what completes later is not looked at.
 /// Main thread only.
 class MainLoop {
 public:
@@ -43,8 +44,12 @@ public:
     /// Starts one call and waits for it and for all others in flight.
     Outcome Run(const StartFunction& inStart, const CancelFunction& inCancel);
     /// The same for a call that must come to its end, such as giving back what was taken: it is started also
-    /// after an interrupt, and is not cancelled by one. Throws nothing.
+    /// after an interrupt, and is not cancelled by one. Throws nothing: with a network that is given up it is
+    /// the outcome of a hub that cannot be reached.
     Outcome RunToEnd(const StartFunction& inStart);
+    /// Runs something that blocks on another thread and waits for it. An interrupt ends the use of the hub,
+    /// and with it what the function blocks on. The function must own all that it uses.
+    void RunBlocking(const std::function<void()>& inFunction);
     /// Returns true when the condition holds, false when the time is over. It is asked after each piece of
     /// work of the main thread. Throws a Failure (cancelled) after an interrupt.
     bool WaitUntil(const std::function<bool()>& inCondition, std::chrono::milliseconds inTime);
@@ -59,7 +64,10 @@ public:
     ConnectOutcome Connect(const ConnectStart& inStart);
 
     std::size_t InFlight() const noexcept { return mInFlight.size(); }
+    /// Throws also when the network is given up (network).
     void ThrowIfInterrupted() const;
+    /// The hub did not come back in time: ends all waits.
+    void GiveUpNetwork();
     bool IsInterrupted() const noexcept { return mInterrupt.IsRequested(); }
     /// Cancels what is in flight and waits for its end. For the way out after a failure.
     void Drain();
@@ -76,6 +84,7 @@ private:
 
     Interrupt& mInterrupt;
     bool mCancelled = false;
+    bool mNetworkIsGivenUp = false;
     std::size_t mLastCall = 0;
     std::map<std::size_t, Call> mInFlight;
 };

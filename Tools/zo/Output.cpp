@@ -54,7 +54,9 @@ std::string Bar(std::uint64_t inDone, std::uint64_t inTotal, std::size_t inColum
 }  // namespace
 
 Output::Output()
-    : mOutIsTerminal(::isatty(STDOUT_FILENO) == 1), mErrorIsTerminal(::isatty(STDERR_FILENO) == 1) {}
+    : mInIsTerminal(::isatty(STDIN_FILENO) == 1),
+      mOutIsTerminal(::isatty(STDOUT_FILENO) == 1),
+      mErrorIsTerminal(::isatty(STDERR_FILENO) == 1) {}
 
 void Output::Configure(const Settings& inSettings) {
     mSettings = inSettings;

@@ -31,6 +31,11 @@ public:
     bool IsJson() const noexcept { return mSettings.json; }
     bool IsQuiet() const noexcept { return mSettings.quiet; }
     bool ErrorIsTerminal() const noexcept { return mErrorIsTerminal; }
+    /// Whether somebody sits before it who can be told and asked: standard input and error are a terminal,
+    /// and neither --json nor --quiet was given.
+    bool HasPerson() const noexcept {
+        return mInIsTerminal && mErrorIsTerminal && !mSettings.json && !mSettings.quiet;
+    }
 
     /// With --json: one line on standard output.
     void Record(const Json& inObject);
@@ -67,6 +72,7 @@ private:
     static std::size_t TerminalWidth(int inDescriptor);
 
     Settings mSettings;
+    bool mInIsTerminal = false;
     bool mOutIsTerminal = false;
     bool mErrorIsTerminal = false;
     bool mColorOut = false;

@@ -147,14 +147,14 @@ WorkSession OpenSession(Context& ioContext) {
     if (!session) {
         const LoadedProduction production = LoadProductionAt(ioContext, open.production, "");
         session = FindListed(ioContext, open, production);
-        InterfaceRef<ZOCL::IZOCEditingSession> made;
         if (!session) {
-            // It blocks; an interrupt is noticed as soon as the hub has answered.
             const auto name =
                 ostcore::utility::ToUTF16(ioContext.ConnectedTarget().user + " on " + open.name);
-            production.production->CreateEditingSession(made, name, ZOCL::UString(), false);
-            ioContext.Loop().ThrowIfInterrupted();
-            const auto resource = RFL::QueryInterface<ZOCL::IZOCServerResource>(made);
+            const auto made = std::make_shared<InterfaceRef<ZOCL::IZOCEditingSession>>();
+            ioContext.Loop().RunBlocking([made, name, parent = production.production] {
+                parent->CreateEditingSession(*made, name, ZOCL::UString(), false);
+            });
+            const auto resource = RFL::QueryInterface<ZOCL::IZOCServerResource>(*made);
             if (!resource) {
                 throw Failure(ExitCode::NotPermitted,
                               "making a session on " + open.name + ": the hub gave none",

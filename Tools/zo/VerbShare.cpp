@@ -76,7 +76,8 @@ Failure RefusedShare(Context& ioContext, const WorkSession& inSession, const Out
         }
         return Failure::OfRequest(what, inOutcome.result, inOutcome.response, kBehindHint);
     }
-    return Failure::OfRequest(what, inOutcome.result, inOutcome.response);
+    return Failure::OfRequest(what, inOutcome.result, inOutcome.response,
+                              HintAfterLostAnswer(inOutcome.result, inOutcome.response));
 }
 
 void Share(Context& ioContext, const WorkSession& inSession, const std::vector<Change>& inOutgoing,

@@ -88,7 +88,8 @@ std::string Commit(Context& ioContext, const WorkSession& inSession, const OpenT
         throw SessionMoved(ioContext, inSession, what, inSession.view.commit);
     }
     if (!outcome.Succeeded()) {
-        throw Failure::OfRequest(what, outcome.result, outcome.response);
+        throw Failure::OfRequest(what, outcome.result, outcome.response,
+                                 HintAfterLostAnswer(outcome.result, outcome.response));
     }
     const std::string commit = TextInAnswer(outcome.response, "zo:commitId");
     const auto session = RFL::QueryInterface<ZOCL::IZOCProduction>(outcome.resource);
