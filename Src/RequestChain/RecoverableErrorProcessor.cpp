@@ -165,9 +165,6 @@ void RecoverableErrorProcessor::OnCompleted(const shared_ptr<Request>& inRequest
     const bool isRepetition = inRequest->retriesLeft != kRetries;
     inRequest->response = isRepetition ? MarkAsRepetition(inResponse) : inResponse;
     if (!IsRecoverableError(inResponse)) {
-        if (inRequest->retriesLeft < kRetries) {
-            inRequest->response = MarkAsRepetition(inResponse);
-        }
         End(inRequest);
         ReportSuccess();
         return;
