@@ -3,6 +3,8 @@
 // All of it runs on one thread, so nothing is shared but what the public calls post to that thread.
 #include "FaultProxy.h"
 
+#include <fcntl.h>
+
 #include <algorithm>
 #include <boost/asio/co_spawn.hpp>
 #include <boost/asio/connect.hpp>
@@ -31,6 +33,12 @@ constexpr std::size_t kMaximumLog = 10000;
 constexpr std::size_t kTricklePieces = 32;
 constexpr std::string_view kContinue = "HTTP/1.1 100 Continue\r\n\r\n";
 constexpr std::string_view kGarbage = "\x16\x03\x01 this is no HTTP \xff\xfe\r\n<html>500</html>\r\n\r\n";
+
+/// A child that inherits a socket would keep it open when it is closed here.
+template <class AnySocket>
+void KeepFromChildren(AnySocket& ioSocket) {
+    fcntl(ioSocket.native_handle(), F_SETFD, FD_CLOEXEC);
+}
 
 /// One connection of a client and the one to the hub that belongs to it.
 struct Link {
@@ -120,6 +128,7 @@ public:
           mRestoreTimer(mIO) {
         // Bound and never listening, it keeps the port from others while new connections are refused.
         mPlaceholder.open(tcp::v4());
+        KeepFromChildren(mPlaceholder);
         mPlaceholder.set_option(asio::socket_base::reuse_address(true));
         mPlaceholder.bind({asio::ip::address_v4::loopback(), inOwnPort});
         mPort = mPlaceholder.local_endpoint().port();
@@ -184,6 +193,7 @@ private:
             return;
         }
         mAcceptor.open(tcp::v4());
+        KeepFromChildren(mAcceptor);
         mAcceptor.set_option(asio::socket_base::reuse_address(true));
         mAcceptor.bind({asio::ip::address_v4::loopback(), mPort});
         mAcceptor.listen();
@@ -213,6 +223,7 @@ private:
         try {
             for (;;) {
                 tcp::socket client = co_await mAcceptor.async_accept(asio::use_awaitable);
+                KeepFromChildren(client);
                 client.set_option(tcp::no_delay(true));
                 const auto link = std::make_shared<Link>(std::move(client), mConnections++);
                 mLinks.insert(link);
@@ -352,6 +363,7 @@ private:
         }
         const tcp::endpoint hub(asio::ip::address_v4::loopback(), mHubPort);
         co_await ioLink.hub.async_connect(hub, asio::use_awaitable);
+        KeepFromChildren(ioLink.hub);
         ioLink.hub.set_option(tcp::no_delay(true));
     }
 
