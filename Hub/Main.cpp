@@ -10,7 +10,7 @@ constexpr char kHelp[] = R"(zohub, a collaboration hub for one machine
 
   zohub serve [--port N] [--tls-port N] [--no-tls] [--listen ADDRESS] [--ready-file FILE]
               [--token-lifetime SECONDS] [--max-connections N] [--max-body BYTES] [--read-threads N]
-              [--header-timeout-ms N] [--body-timeout-ms N]
+              [--header-timeout-ms N] [--body-timeout-ms N] [--faults SCRIPT]
   zohub user add NAME --password-file FILE|--password-stdin [--admin] [--replace]
               [--first-name TEXT] [--last-name TEXT] [--email TEXT]
   zohub import DIR --production NAME --owner USER [--grant USER]... [--mount LABEL] [--template]

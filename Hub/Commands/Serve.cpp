@@ -12,6 +12,7 @@
 #include "Base/Text.h"
 #include "Commands/Arguments.h"
 #include "Commands/Commands.h"
+#include "Faults/FaultInjector.h"
 #include "Http/Server.h"
 #include "Http/Tls.h"
 #include "Routes/Hub.h"
@@ -86,6 +87,20 @@ ServerLimits ReadLimits(Arguments const& inArguments) {
     return limits;
 }
 
+// Null without a script.
+std::unique_ptr<FaultInjector> ReadFaults(Arguments const& inArguments, Hub& ioHub) {
+    if (!inArguments.Has("--faults"))
+        return nullptr;
+    std::string const path = inArguments.Need("--faults");
+    std::ifstream file(path, std::ios::binary);
+    std::string const text{std::istreambuf_iterator<char>(file), std::istreambuf_iterator<char>()};
+    if (!file || fs::is_directory(path))
+        throw std::runtime_error("cannot read the fault script " + path);
+    return std::make_unique<FaultInjector>(
+        ParseFaultScript(text, path), [&ioHub](Request const& inRequest) { ioHub.ForgetToken(inRequest); },
+        [](std::string const& inFault) { std::cerr << "zohub: fault, " + inFault + "\n"; });
+}
+
 }  // namespace
 
 int RunServe(std::vector<std::string> const& inWords) {
@@ -100,6 +115,7 @@ int RunServe(std::vector<std::string> const& inWords) {
                                         {"--header-timeout-ms"},
                                         {"--body-timeout-ms"},
                                         {"--read-threads"},
+                                        {"--faults"},
                                         {"--no-tls", false}});
     arguments.Words(0, "serve [options]");
     // Before any thread starts, so that all of them leave these signals to this one.
@@ -117,9 +133,13 @@ int RunServe(std::vector<std::string> const& inWords) {
     Hub hub(*storage, settings, SystemClock());
 
     std::string const address = arguments.Get("--listen", "127.0.0.1");
+    auto const faults = ReadFaults(arguments, hub);
+    FaultFunction faultOf;
+    if (faults)
+        faultOf = [&faults](Request const& inRequest) { return faults->PlanFor(inRequest); };
     Server server(
         ReadLimits(arguments), [&hub](Request const& inRequest) { return hub.Handle(inRequest); },
-        Hub::LaneOf);
+        Hub::LaneOf, faultOf);
     auto const plainPort = server.ListenPlain(
         address, static_cast<std::uint16_t>(arguments.Number("--port", kPlainPort, 65535)));
     std::string const httpUrl = "http://" + HostInUrl(address) + ":" + std::to_string(plainPort);
@@ -144,6 +164,8 @@ int RunServe(std::vector<std::string> const& inWords) {
     if (!tlsUrl.empty())
         std::cout << "zohub: listening on " << tlsUrl << "\nzohub: certificate authority " << CaFilePath(data)
                   << "\n";
+    if (faults)
+        std::cout << "zohub: FAULTS ARE ON, as " << arguments.Get("--faults") << " says\n";
     std::cout << std::flush;
 
     int received = 0;

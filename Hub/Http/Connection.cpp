@@ -3,6 +3,7 @@
 
 #include <boost/asio/dispatch.hpp>
 #include <boost/asio/post.hpp>
+#include <boost/asio/steady_timer.hpp>
 #include <boost/asio/write.hpp>
 #include <boost/beast/core/flat_buffer.hpp>
 #include <boost/beast/core/tcp_stream.hpp>
@@ -10,9 +11,11 @@
 #include <boost/beast/http/read.hpp>
 #include <boost/beast/ssl/ssl_stream.hpp>
 #include <type_traits>
+#include <utility>
 
 #include "Base/Error.h"
 #include "Base/Text.h"
+#include "Http/FaultySender.h"
 #include "Http/RequestReader.h"
 
 namespace zohub {
@@ -254,15 +257,31 @@ private:
         } catch (Failure const& failure) {
             return Refuse(failure);
         }
-        Lane const lane = mCore.laneOf(request);
+        if (!mCore.faultOf)
+            return Dispatch(std::move(request), keepAlive);
+        mPlan = mCore.faultOf(request);
+        if (mPlan.isRefused)
+            return Reset();
+        if (mPlan.delay.count() == 0)
+            return Dispatch(std::move(request), keepAlive);
+        mFaultTimer.expires_after(mPlan.delay);
+        mFaultTimer.async_wait(
+            [self = Self(), request = std::move(request), keepAlive](beast::error_code inError) mutable {
+                if (!inError)
+                    self->Dispatch(std::move(request), keepAlive);
+            });
+    }
+
+    void Dispatch(Request inRequest, bool inKeepAlive) {
+        Lane const lane = mCore.laneOf(inRequest);
         if (lane == Lane::SignIn && ++mCore.signInsWaiting > kMaxSignInsWaiting) {
             --mCore.signInsWaiting;
             return Refuse(
                 Failure(503, "too-many-logins", "Too many sign-ins at once; try again in a moment."));
         }
         asio::post(mCore.PoolOf(lane),
-                   [self = Self(), request = std::move(request), keepAlive, lane]() mutable {
-                       Outgoing out = self->Work(std::move(request), keepAlive);
+                   [self = Self(), request = std::move(inRequest), inKeepAlive, lane]() mutable {
+                       Outgoing out = self->Work(std::move(request), inKeepAlive);
                        if (lane == Lane::SignIn)
                            --self->mCore.signInsWaiting;
                        // The executor is copied out: once posted, the connection may end on another thread.
@@ -279,7 +298,7 @@ private:
     Outgoing Work(Request inRequest, bool inKeepAlive) const {
         bool const isHead = inRequest.method == "HEAD";
         try {
-            Response const response = mCore.handler(inRequest);
+            Response const response = Answer(inRequest);
             return MakeOutgoing(response, isHead, AcceptsGzip(inRequest), inKeepAlive && !mCore.isStopping);
         } catch (std::exception const&) {
             return MakeOutgoing(ErrorResponse(500, "internal-error", "The hub could not make its answer."),
@@ -287,9 +306,18 @@ private:
         }
     }
 
+    Response Answer(Request const& inRequest) const {
+        if (mPlan.beforeWork)
+            mPlan.beforeWork(inRequest);
+        Response const response = mPlan.insteadOfWork ? *mPlan.insteadOfWork : mCore.handler(inRequest);
+        return mPlan.insteadOfAnswer ? *mPlan.insteadOfAnswer : response;
+    }
+
     void Send(Outgoing inOutgoing) {
         mOutgoing = std::move(inOutgoing);
         mWritten = 0;
+        if (mPlan.ending != FaultPlan::Ending::Whole)
+            return SendFaulty();
         Lowest().expires_at(Deadline(0));
         std::size_t const size = mOutgoing.body ? mOutgoing.body->size() : 0;
         std::size_t const joined = size <= kJoinUpTo ? size : 0;
@@ -300,6 +328,21 @@ private:
                           [self = Self(), joined](beast::error_code inError, std::size_t) {
                               self->OnWritten(inError, joined);
                           });
+    }
+
+    void SendFaulty() {
+        Lowest().expires_never();
+        std::string const body = mOutgoing.body ? *mOutgoing.body : std::string();
+        std::make_shared<FaultySender<Stream>>(mStream, mFaultTimer, mOutgoing.head, body,
+                                               std::exchange(mPlan, FaultPlan()),
+                                               [self = Self()](AfterFault inNext) {
+                                                   if (inNext == AfterFault::GoOn)
+                                                       return self->OnSent();
+                                                   if (inNext == AfterFault::Reset)
+                                                       return self->Reset();
+                                                   self->CloseGently();
+                                               })
+            ->Step();
     }
 
     void OnWritten(beast::error_code inError, std::size_t inCount) {
@@ -363,7 +406,16 @@ private:
             Close();
     }
 
-    void Close() { Lowest().close(); }
+    void Reset() {
+        beast::error_code ignored;
+        Lowest().socket().set_option(asio::socket_base::linger(true, 0), ignored);
+        Close();
+    }
+
+    void Close() {
+        mFaultTimer.cancel();
+        Lowest().close();
+    }
 
     ServerCore& mCore;
     std::shared_ptr<asio::ssl::context> const mTls;
@@ -372,6 +424,8 @@ private:
     beast::flat_buffer mBuffer{128 * 1024};
     std::optional<BodyParser> mParser;
     SteadyClock::time_point mStarted;
+    FaultPlan mPlan;  // for the request that is being handled
+    asio::steady_timer mFaultTimer{mStream.get_executor()};
     Outgoing mOutgoing;
     std::size_t mWritten = 0;
     std::size_t mReserved = 0;

@@ -86,8 +86,10 @@ private:
 
 class Server::Implementation {
 public:
-    Implementation(ServerLimits const& inLimits, RequestHandler inHandler, LaneFunction inLaneOf)
-        : mCore(inLimits, std::move(inHandler), std::move(inLaneOf)), mWork(mCore.io.get_executor()) {}
+    Implementation(ServerLimits const& inLimits, RequestHandler inHandler, LaneFunction inLaneOf,
+                   FaultFunction inFaultOf)
+        : mCore(inLimits, std::move(inHandler), std::move(inLaneOf), std::move(inFaultOf)),
+          mWork(mCore.io.get_executor()) {}
 
     std::uint16_t Listen(std::string const& inAddress, std::uint16_t inPort,
                          std::shared_ptr<asio::ssl::context> inTls) {
@@ -146,9 +148,10 @@ private:
     std::vector<std::thread> mThreads;
 };
 
-Server::Server(ServerLimits const& inLimits, RequestHandler inHandler, LaneFunction inLaneOf)
-    : mImplementation(std::make_shared<Implementation>(inLimits, std::move(inHandler), std::move(inLaneOf))) {
-}
+Server::Server(ServerLimits const& inLimits, RequestHandler inHandler, LaneFunction inLaneOf,
+               FaultFunction inFaultOf)
+    : mImplementation(std::make_shared<Implementation>(inLimits, std::move(inHandler), std::move(inLaneOf),
+                                                       std::move(inFaultOf))) {}
 
 Server::~Server() {
     Stop();

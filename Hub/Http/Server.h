@@ -8,6 +8,7 @@
 #include <memory>
 #include <string>
 
+#include "Http/FaultPlan.h"
 #include "Http/Message.h"
 
 namespace zohub {
@@ -37,7 +38,9 @@ using LaneFunction = std::function<Lane(Request const&)>;
 
 class Server {
 public:
-    Server(ServerLimits const& inLimits, RequestHandler inHandler, LaneFunction inLaneOf);
+    /// The fault function is for those who want to see their client in trouble; without one all is well.
+    Server(ServerLimits const& inLimits, RequestHandler inHandler, LaneFunction inLaneOf,
+           FaultFunction inFaultOf = nullptr);
     /// Stops.
     ~Server();
     Server(Server const&) = delete;

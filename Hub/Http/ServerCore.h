@@ -14,10 +14,12 @@
 namespace zohub {
 
 struct ServerCore {
-    ServerCore(ServerLimits const& inLimits, RequestHandler inHandler, LaneFunction inLaneOf)
+    ServerCore(ServerLimits const& inLimits, RequestHandler inHandler, LaneFunction inLaneOf,
+               FaultFunction inFaultOf)
         : limits(inLimits),
           handler(std::move(inHandler)),
           laneOf(std::move(inLaneOf)),
+          faultOf(std::move(inFaultOf)),
           io(static_cast<int>(inLimits.ioThreads)),
           readers(inLimits.readThreads),
           writers(inLimits.writeThreads),
@@ -26,6 +28,7 @@ struct ServerCore {
     ServerLimits const limits;
     RequestHandler const handler;
     LaneFunction const laneOf;
+    FaultFunction const faultOf;  // may be empty
     std::atomic<std::size_t> signInsWaiting{0};
     std::atomic<std::uint64_t> bodyBytes{0};
     std::atomic<bool> isStopping{false};

@@ -14,6 +14,7 @@ namespace zohub {
 namespace {
 
 constexpr std::size_t kMaxIdempotencyKey = 128;
+constexpr std::uint64_t kAnswersBetweenCounts = 256;
 constexpr char kLoginSegments[] = "zo/1/system/login";
 
 std::string JoinedPath(Request const& inRequest) {
@@ -201,6 +202,12 @@ Response Hub::Handle(Request const& inRequest) {
     }
 }
 
+void Hub::ForgetToken(Request const& inRequest) {
+    auto const transaction = mStorage.BeginWrite();
+    transaction->RemoveToken(Sha256Hex(inRequest.Cookie("login-token")));
+    transaction->Commit();
+}
+
 Response Hub::Run(Request const& inRequest) {
     if (LaneOf(inRequest) == Lane::SignIn)
         return SignInByForm(inRequest, mStorage, mSettings, mClock());
@@ -258,6 +265,9 @@ Response Hub::RunMutation(Call& ioCall, Route const& inRoute, std::string const&
     Response response = inRoute.handle(ioCall);
     if (!key.empty()) {
         ioCall.transaction.RemoveAnswersBefore(ioCall.now - kDay);
+        // Now and then: the count may go a little beyond what is kept.
+        if (++mKeptAnswers % kAnswersBetweenCounts == 0)
+            ioCall.transaction.KeepNewestAnswers(mSettings.maxKeptAnswers);
         ioCall.transaction.AddAnswer(RecordOf(response, ioCall, key, inFingerprint));
     }
     ioCall.transaction.Commit();

@@ -1,6 +1,7 @@
 // The hub's application: storage, clock and caches, and the way of a request through its route.
 #pragma once
 
+#include <atomic>
 #include <functional>
 #include <memory>
 #include <string>
@@ -22,6 +23,7 @@ struct HubSettings {
     std::string description = "Development hub";
     Micros tokenLifetime = kDay;
     std::size_t documentCacheBytes = 384u << 20;
+    std::int64_t maxKeptAnswers = 200000;  ///< to requests with a key; older ones go first
 };
 
 /// What a route makes of a large body before the database is locked for writing.
@@ -72,6 +74,8 @@ public:
     /// Runs the request inside one transaction. What is refused or fails is undone and answered as JSON.
     Response Handle(Request const& inRequest);
     static Lane LaneOf(Request const& inRequest);
+    /// Ends the life of the token that the request came with, when it has one.
+    void ForgetToken(Request const& inRequest);
 
 private:
     struct Match;
@@ -86,6 +90,7 @@ private:
     HubSettings const mSettings;
     Clock const mClock;
     DocumentCache mCache;
+    std::atomic<std::uint64_t> mKeptAnswers{0};
     std::vector<CompiledRoute> mRoutes;
 };
 

@@ -221,6 +221,16 @@ public:
         mConnection->Prepare("DELETE FROM answers WHERE created<?").Bind(inTime).Run();
     }
 
+    void KeepNewestAnswers(std::int64_t inCount) override {
+        mConnection
+            ->Prepare(
+                "DELETE FROM answers WHERE created<(SELECT created FROM answers ORDER BY created DESC LIMIT "
+                "1 "
+                "OFFSET ?)")
+            .Bind(inCount - 1)
+            .Run();
+    }
+
     void VisitObjects(Visitor const& inVisitor) override {
         auto row = mConnection->Prepare("SELECT hash,data FROM objects");
         while (row.Step())

@@ -88,6 +88,8 @@ public:
                                                    Micros inNotBefore) = 0;
     virtual void AddAnswer(AnswerRecord const& inAnswer) = 0;
     virtual void RemoveAnswersBefore(Micros inTime) = 0;
+    /// Removes all but the newest so many.
+    virtual void KeepNewestAnswers(std::int64_t inCount) = 0;
 
     using Visitor = std::function<void(std::string const& hash, std::string_view bytes)>;
     virtual void VisitObjects(Visitor const& inVisitor) = 0;

@@ -59,16 +59,31 @@ bool HasLink(Json const& inDocument, std::string const& inRelation) {
     return !LinkOf(inDocument, inRelation).empty();
 }
 
-RunningHub::RunningHub(ServerLimits const& inLimits)
+RunningHub::RunningHub(ServerLimits const& inLimits, std::string const& inFaultScript)
     : mStorage(OpenSqliteStorage(mDirectory.Path().string())) {
     HubSettings settings;
     settings.id = "hub-under-test";
     settings.tokenLifetime = 3600 * kSecond;
     mHub = std::make_unique<Hub>(*mStorage, settings, [this] { return mNow.load(); });
+    mFaults = std::make_unique<FaultInjector>(
+        ParseFaultScript(inFaultScript, "script"),
+        [this](Request const& inRequest) { mHub->ForgetToken(inRequest); },
+        [this](std::string const& inFault) {
+            std::lock_guard const lock(mMutex);
+            mToldFaults.push_back(inFault);
+        });
+    FaultFunction faultOf;
+    if (!inFaultScript.empty())
+        faultOf = [this](Request const& inRequest) { return mFaults->PlanFor(inRequest); };
     mServer = std::make_unique<Server>(
-        inLimits, [this](Request const& inRequest) { return mHub->Handle(inRequest); }, Hub::LaneOf);
+        inLimits, [this](Request const& inRequest) { return mHub->Handle(inRequest); }, Hub::LaneOf, faultOf);
     mPort = mServer->ListenPlain("127.0.0.1", 0);
     mServer->Start();
+}
+
+std::vector<std::string> RunningHub::ToldFaults() const {
+    std::lock_guard const lock(mMutex);
+    return mToldFaults;
 }
 
 void RunningHub::AddUser(std::string const& inName, std::string const& inPassword, bool inIsAdmin) {

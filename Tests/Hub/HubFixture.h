@@ -6,8 +6,10 @@
 #include <atomic>
 #include <filesystem>
 #include <memory>
+#include <mutex>
 
 #include "Base/Json.h"
+#include "Faults/FaultInjector.h"
 #include "Http/Server.h"
 #include "RawClient.h"
 #include "Routes/Hub.h"
@@ -36,7 +38,8 @@ bool HasLink(Json const& inDocument, std::string const& inRelation);
 
 class RunningHub {
 public:
-    explicit RunningHub(ServerLimits const& inLimits = {});
+    /// With a script of faults it follows that.
+    explicit RunningHub(ServerLimits const& inLimits = {}, std::string const& inFaultScript = {});
 
     std::uint16_t Port() const { return mPort; }
     Storage& Data() { return *mStorage; }
@@ -45,13 +48,18 @@ public:
     void AddUser(std::string const& inName, std::string const& inPassword, bool inIsAdmin = false);
     Client SignedIn(std::string const& inName);
     void Stop() { mServer->Stop(); }
+    /// What it said of the faults that have come.
+    std::vector<std::string> ToldFaults() const;
 
 private:
     TemporaryDirectory mDirectory;
     std::unique_ptr<Storage> mStorage;
     std::atomic<Micros> mNow{1800000000 * kSecond};
     std::unique_ptr<Hub> mHub;
+    std::unique_ptr<FaultInjector> mFaults;
     std::unique_ptr<Server> mServer;
+    mutable std::mutex mMutex;
+    std::vector<std::string> mToldFaults;  // under mMutex
     std::uint16_t mPort = 0;
 };
 
