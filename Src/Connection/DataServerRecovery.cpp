@@ -50,14 +50,16 @@ void DataServer::OnNetworkDown() {
 }
 
 void DataServer::OnNetworkBack() {
+    const bool isWarning = mPromptActive;
     const bool wasDown = mWarnAboutErrors.exchange(false);
     CloseNetworkWarning();
     if (!wasDown) {
         return;
     }
     TellNetworkState(false);
-    // A question for the password gives way to the warning, and has its turn now.
-    if (mTokenLost) {
+    // A question for the password gives way to the network, and has its turn now; with a warning on show,
+    // when that has gone.
+    if (mTokenLost && !isWarning) {
         QueueShowWarnings();
     }
 }
