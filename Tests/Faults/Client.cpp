@@ -4,6 +4,7 @@
 #include <deque>
 #include <filesystem>
 
+#include "ostcore/debug/DebugDatabase.h"
 #include "ostcore/debug/Trace.h"
 #include "ostcore/threads/MainThread.h"
 #include "ZOClient/Library.h"
@@ -46,6 +47,8 @@ public:
             const std::lock_guard<std::mutex> lock(TheTraceLog().mutex);
             TheTraceLog().lines.push_back(inLine);
         });
+        // Each test is about one exchange; those about a retry turn them on again.
+        ostcore::debug::DebugDatabase::SetOverride("ZOClient.DisableRetries", "true");
         ZOCL::Initialize();
     }
     void TearDown() override {

@@ -8,6 +8,7 @@
 #include <set>
 
 #include "Client.h"
+#include "ostnet/http/Compression.h"
 
 namespace faults {
 namespace {
@@ -279,17 +280,20 @@ TEST_F(Renewal, ALargeFormWhoseTokenExpiresOnTheWayArrivesOnceAndWhole) {
     }
     std::vector<std::size_t> sizes;
     std::vector<std::size_t> hashes;
-    hub.Interfere(
-        Step::kOther, [&](Connection& ioConnection, const ReceivedRequest& inRequest, const HubAnswer&) {
-            // One connection after the other, as the second form follows the answer to the first.
-            const std::size_t begin = inRequest.body.find(large.substr(0, 64));
-            sizes.push_back(inRequest.body.size());
-            hashes.push_back(begin == std::string::npos
-                                 ? 0
-                                 : std::hash<std::string_view>()(
-                                       std::string_view(inRequest.body).substr(begin, large.size())));
-            return ioConnection.Write(HubAnswer{sizes.size() == 1 ? 401 : 201, "", ""}.Bytes());
-        });
+    hub.Interfere(Step::kOther,
+                  [&](Connection& ioConnection, const ReceivedRequest& inRequest, const HubAnswer&) {
+                      // One connection after the other, as the second form follows the answer to the first.
+                      EXPECT_EQ(inRequest.Header("Content-Encoding"), "gzip");
+                      const auto form = ostnet::http::DecompressPayload(
+                          ostcore::utility::RecycledMemory::CreateFromBytes(inRequest.body));
+                      const std::string_view body = form ? form->view() : std::string_view();
+                      const std::size_t begin = body.find(large.substr(0, 64));
+                      sizes.push_back(inRequest.body.size());
+                      hashes.push_back(begin == std::string_view::npos
+                                           ? 0
+                                           : std::hash<std::string_view>()(body.substr(begin, large.size())));
+                      return ioConnection.Write(HubAnswer{sizes.size() == 1 ? 401 : 201, "", ""}.Bytes());
+                  });
     std::promise<int> status;
     const ostnet::http::Form form{{ImmutableString("name"), "film"}, {ImmutableString("data"), large}};
     ASSERT_TRUE(server->POST(

@@ -1,5 +1,8 @@
 // The connection breaks off at any byte of any answer on the way from the discovery document to a payload.
+#include <atomic>
+
 #include "Client.h"
+#include "ostcore/debug/DebugDatabase.h"
 
 namespace faults {
 namespace {
@@ -78,6 +81,32 @@ TEST_P(BrokenOffAnswer, LeavesWhatWasToBeLoadedUnloaded) {
         hub.BeGood();
         EXPECT_EQ(mClient.Load(resource).result, ZOCL::kResultSuccess);
         EXPECT_TRUE(resource->IsLoaded());
+    }
+}
+
+TEST_P(BrokenOffAnswer, IsAskedForAgainUntilItComesWhole) {
+    ostcore::debug::DebugDatabase::SetOverride("ZOClient.DisableRetries", "false");
+    BadHub hub;
+    const auto server = SignIn(hub);
+    ostcore::debug::DebugDatabase::SetOverride("ZOClient.DisableRetries", "true");
+    const std::string answer = hub.GoodAnswer(Step::kProductions).Bytes();
+    const auto resource = AsResource(server->GetProductionList(false));
+    for (const std::size_t at : {std::size_t(0), std::size_t(9), answer.size() / 2, answer.size() - 1}) {
+        const std::size_t before = hub.CountRequests("GET", "/p");
+        const auto left = std::make_shared<std::atomic<int>>(2);
+        hub.Interfere(Step::kProductions,
+                      [at, left](Connection& ioConnection, const ReceivedRequest&, const HubAnswer& inGood) {
+                          if (left->fetch_sub(1) <= 0) {
+                              return ioConnection.Write(inGood.Bytes());
+                          }
+                          ioConnection.Write(inGood.Bytes().substr(0, at));
+                          if (GetParam() == Ending::kReset) {
+                              ioConnection.Reset();
+                          }
+                          return false;
+                      });
+        EXPECT_EQ(mClient.Refresh(resource).result, ZOCL::kResultSuccess) << at;
+        EXPECT_EQ(hub.CountRequests("GET", "/p"), before + 3) << at;
     }
 }
 
