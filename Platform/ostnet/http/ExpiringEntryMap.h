@@ -27,10 +27,11 @@ struct ExpiryLimits {
 
 /// A map with last-access times.
 ///
-/// An insertion queues a sweep, unless one is queued. The sweep drops an entry only when it is both beyond
-/// the number and older than the age: the maxEntries that were used last stay however old they are, and what
-/// was used within maxAgeSeconds stays however many there are. As long as there are too many, another sweep
-/// follows. Time is that of the global scheduler at the map's construction.
+/// While there are more than maxEntries, each insertion queues a sweep, unless one is queued. The sweep drops
+/// an entry only when it is both beyond the number and older than the age: the maxEntries that were used last
+/// stay however old they are, and what was used within maxAgeSeconds stays however many there are. As long as
+/// there are too many, another sweep follows; a map that is within its number keeps no timer. Time is that of
+/// the global scheduler at the map's construction.
 ///
 /// Threads: any. Values are copied in and out under the map's own lock, so they should be small (a shared
 /// pointer, a flag); they are released outside it.
@@ -83,6 +84,7 @@ private:
         optional<Value> Insert(const Key& inKey, Value&& inValue) ZO_EXCLUDES(mMutex) {
             const Time now = mScheduler->Now();
             optional<Value> former;
+            bool areTooMany = false;
             {
                 ostcore::threads::MutexLock lock(mMutex);
                 const auto found = mEntries.find(inKey);
@@ -92,8 +94,11 @@ private:
                     former = std::exchange(found->second.value, std::move(inValue));
                     found->second.lastAccess = now;
                 }
+                areTooMany = mEntries.size() > mLimits.maxEntries;
             }
-            QueueSweep();
+            if (areTooMany) {
+                QueueSweep();
+            }
             return former;
         }
 
