@@ -113,7 +113,6 @@ TEST_F(BatchOperationTest, ALoadEndsWithTheResultOfTheLoad) {
     Settle();
     EXPECT_EQ(ends.count, 1);
     EXPECT_EQ(operation->GetResult(), kResultHTTPForbidden);
-    EXPECT_EQ(LastRequest().requestID, operation->GetRequestID());
     const InterfaceRef<ZOLoadServerResourceOperation> aborted(
         new ZOLoadServerResourceOperation(Plain("/r"), Guid::CreateUnique()));
     aborted->Abort();

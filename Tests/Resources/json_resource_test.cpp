@@ -146,7 +146,7 @@ TEST_F(JSONResourceTest, SelfIsTheURLFromThenOn) {
     Outcome outcome;
     ASSERT_TRUE(resource->Refresh(Guid::CreateUnique(), outcome.Function()));
     EXPECT_EQ(outcome.Wait(), kResultSuccess);
-    EXPECT_EQ(LastRequest().Header("If-None-Match"), "\"t1\"");
+    EXPECT_EQ(LastRequest().CountHeader("If-None-Match"), 0u) << "the cache holds nothing of this URL";
     EXPECT_EQ(resource->GetHTTPURL().view(), self);
     EXPECT_EQ(resource->GetETag(true).view(), "\"n\"");
 }
