@@ -53,8 +53,8 @@ public:
     virtual void Remove(const ImmutableString& inKey, const ImmutableString& inName) = 0;
     /// Waits until what was accepted is written; false when the time passed first.
     virtual bool WaitForWrites(std::uint32_t inMilliseconds) = 0;
-    /// The end of use: what was accepted is written if the time allows it, and no work of the cache is left
-    /// afterwards. Everything fails from then on. Not from a completion.
+    /// The end of use: what was accepted is written, and the work of the cache comes to its end, if the time
+    /// allows it. Everything fails from then on. Not from a completion.
     virtual void Close(std::uint32_t inMilliseconds) = 0;
 };
 

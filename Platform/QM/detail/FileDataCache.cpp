@@ -380,7 +380,8 @@ void FileDataCache::Close(std::uint32_t inMilliseconds) {
     WaitForWrites(inMilliseconds);
     mIsClosed = true;
     mWriter->Stop();
-    mReaders->Wait(ostcore::threads::kForever);
+    // A read can hang in the system, on a disk that is somewhere else; the end of the host must not.
+    mReaders->Wait(inMilliseconds);
     MutexLock lock(mMutex);
     mPending.clear();
     mPendingBytes = 0;
