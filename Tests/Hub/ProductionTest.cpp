@@ -1,5 +1,7 @@
 // Productions, templates, copies, commits and conditional requests.
 #include <atomic>
+#include <future>
+#include <set>
 #include <thread>
 
 #include "HubFixture.h"
@@ -172,6 +174,51 @@ TEST_F(ProductionTest, ARepeatedRequestWithItsKeyIsAnsweredFromMemoryForADay) {
     mHub.Advance(kDay + kSecond);
     Client const later = mHub.SignedIn("anna");
     EXPECT_NE(later.PostJson("/zo/1/p", body, {{"Idempotency-Key", "k1"}}).body, first.body);
+}
+
+TEST_F(ProductionTest, ARepeatedPutOrDeleteIsAnsweredFromMemoryToo) {
+    Json const production = MakeProduction(mAnna, "Film");
+    std::string const edit = LinkOf(production, "edit");
+    Client::Headers headers{{"Idempotency-Key", "p1"}, {"If-Match", mAnna.Get(edit).Header("etag")}};
+    std::string const body = R"({"name":"Film","description":"Second cut"})";
+    Answer const first = mAnna.PutJson(edit, body, headers);
+    EXPECT_EQ(first.status, 200);
+    Answer const again = mAnna.PutJson(edit, body, headers);
+    EXPECT_EQ(again.status, 200) << "the tag of before was looked at";
+    EXPECT_EQ(again.body, first.body);
+
+    Json const session =
+        Json::parse(mAnna.PostJson(LinkOf(production, "/sessions"), R"({"name":"Mine"})").body);
+    Client::Headers const key{{"Idempotency-Key", "d1"}};
+    EXPECT_EQ(mAnna.Request("DELETE", LinkOf(session, "delete"), {}, key).status, 204);
+    EXPECT_EQ(mAnna.Request("DELETE", LinkOf(session, "delete"), {}, key).status, 204);
+    EXPECT_EQ(mAnna.Request("DELETE", LinkOf(session, "delete")).status, 404);
+}
+
+// The connection breaks while the first is at work, and the repeat arrives at once.
+TEST_F(ProductionTest, RepeatsThatComeTogetherAreDoneOnce) {
+    std::string const body = R"({"name":"Once","description":"","isTemporary":false})";
+    std::vector<std::future<Answer>> answers;
+    for (int i = 0; i < 8; ++i)
+        answers.push_back(std::async(std::launch::async, [this, body] {
+            return Client(mAnna).PostJson("/zo/1/p", body, {{"Idempotency-Key", "together"}});
+        }));
+    std::set<std::string> bodies;
+    for (auto& answer : answers)
+        bodies.insert(answer.get().body);
+    EXPECT_EQ(bodies.size(), 1u);
+    EXPECT_EQ(Json::parse(mAnna.Get("/zo/1/p").body)["productions"].size(), 1u);
+}
+
+TEST_F(ProductionTest, OfKeptAnswersTheOldestGo) {
+    auto const transaction = mHub.Data().BeginWrite();
+    for (int i = 0; i < 10; ++i)
+        transaction->AddAnswer({"anna", "k" + std::to_string(i), "f", 200, "{}", "", Micros{i + 1}});
+    transaction->KeepNewestAnswers(4);
+    for (int i = 0; i < 10; ++i)
+        EXPECT_EQ(transaction->FindAnswer("anna", "k" + std::to_string(i), 0).has_value(), i >= 6) << i;
+    transaction->KeepNewestAnswers(100);
+    EXPECT_TRUE(transaction->FindAnswer("anna", "k6", 0));
 }
 
 TEST_F(ProductionTest, ARefusedRequestLeavesItsKeyFree) {
