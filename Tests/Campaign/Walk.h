@@ -80,6 +80,8 @@ private:
     Tree mProduction;
     std::map<std::string, Certainty> mShares;
     unsigned mMarkers = 0;
+    /// Some of the faults may leave a call without an answer.
+    bool mMayGiveUp = false;
     /// No change is in doubt, so the model says what must be there.
     bool mIsCertain = true;
     Outcome mOutcome;

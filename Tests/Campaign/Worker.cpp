@@ -177,6 +177,7 @@ private:
     // --- The team.
 
     json Pull(const json& inOrder) {
+        RefreshSession();
         Must("pull", [&](const Guid& inID, const RequestCompletion& inEnd) {
             return mSession->Pull(inID, inEnd, inOrder.at("strategy"), u"");
         });

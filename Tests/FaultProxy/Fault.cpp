@@ -56,18 +56,26 @@ const Kind& KindOf(FaultKind inKind) {
     return kKinds[0];
 }
 
-std::uint32_t WeightOf(const Kind& inKind, bool inWithSwaps) {
-    return inKind.kind == FaultKind::kSwap && inWithSwaps ? kSwapWeight : inKind.weight;
+std::uint32_t WeightOf(const Kind& inKind, const RandomScheduleLimits& inLimits) {
+    switch (inKind.kind) {
+        case FaultKind::kSwap:
+            return inLimits.withSwaps ? kSwapWeight : 0;
+        case FaultKind::kGarbageWithoutWork:
+        case FaultKind::kGarbageAfterWork:
+            return inLimits.withGarbage ? inKind.weight : 0;
+        default:
+            return inKind.weight;
+    }
 }
 
-FaultKind DrawKind(Dice& ioDice, bool inWithSwaps) {
+FaultKind DrawKind(Dice& ioDice, const RandomScheduleLimits& inLimits) {
     std::uint32_t total = 0;
     for (const Kind& kind : kKinds) {
-        total += WeightOf(kind, inWithSwaps);
+        total += WeightOf(kind, inLimits);
     }
     std::uint32_t drawn = ioDice.Below(total);
     for (const Kind& kind : kKinds) {
-        const std::uint32_t weight = WeightOf(kind, inWithSwaps);
+        const std::uint32_t weight = WeightOf(kind, inLimits);
         if (drawn < weight) {
             return kind.kind;
         }
@@ -83,7 +91,7 @@ int DrawOne(Dice& ioDice, const int (&inFrom)[Size]) {
 
 Fault DrawFault(Dice& ioDice, const RandomScheduleLimits& inLimits) {
     Fault fault;
-    fault.kind = DrawKind(ioDice, inLimits.withSwaps);
+    fault.kind = DrawKind(ioDice, inLimits);
     fault.milliseconds = 1 + ioDice.Below(inLimits.maximumMilliseconds);
     fault.share = ioDice.Below(1000);
     fault.status = fault.kind == FaultKind::kStatusAfterWork ? DrawOne(ioDice, kStatusesAfterWork)

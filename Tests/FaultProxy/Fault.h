@@ -91,6 +91,7 @@ struct RandomScheduleLimits {
     std::uint32_t meanGap = 8;
     std::uint32_t maximumMilliseconds = 150;
     bool withSwaps = false;
+    bool withGarbage = true;
 };
 
 /// A finite number of faults whose kinds and places follow from the seed alone.
