@@ -38,7 +38,7 @@ struct ReadResult {
 /// RDF: xml:lang of an outer element holds for the properties below it.
 ///
 /// Foreign input is bounded: document type declarations are refused, and so are packets beyond the limits of
-/// Tree.h, more than 10,000 attributes or 1 MiB in one tag, 4 KiB in the URI of a namespace.
+/// Tree.h, more than 10,000 attributes or about 1 MiB in one tag, 4096 namespaces, 4 KiB in the URI of one.
 ///
 /// Threads: any. Errors: come as a value; only std::bad_alloc is thrown. The reason quotes names, no values.
 ZOPLATFORM_EXPORT ReadResult ReadPacket(std::string_view inBytes);

@@ -12,7 +12,7 @@ namespace {
 
 constexpr std::size_t kMostAttributes = 10000;
 constexpr std::size_t kLongestURI = 4096;
-constexpr std::size_t kMostPrefixes = 4096;
+constexpr std::size_t kMostNamespaces = 4096;
 /// A property and its value are two elements; the wrappers take three.
 constexpr std::size_t kMostFrames = 2 * kMaximumDepth + 3;
 
@@ -510,11 +510,13 @@ void RdfBuilder::DeclarePrefix(std::string_view inPrefix, std::string_view inURI
     if (inURI.size() > kLongestURI) {
         throw Refusal{"the URI of a namespace is too long"};
     }
-    const bool isKept = !inPrefix.empty() && !inURI.empty() && mKnownURIs.size() < kMostPrefixes &&
-                        mKnownURIs.emplace(inURI).second;
-    if (isKept) {
-        mPacket.prefixes.push_back({std::string(inURI), std::string(inPrefix)});
+    if (inPrefix.empty() || inURI.empty() || !mKnownURIs.emplace(inURI).second) {
+        return;
     }
+    if (mKnownURIs.size() > kMostNamespaces) {
+        throw Refusal{"too many namespaces"};
+    }
+    mPacket.prefixes.push_back({std::string(inURI), std::string(inPrefix)});
 }
 
 void RdfBuilder::Count() {
