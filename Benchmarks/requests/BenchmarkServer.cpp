@@ -26,10 +26,11 @@ void Watch(int inEpoll, int inSocket) {
     epoll_ctl(inEpoll, EPOLL_CTL_ADD, inSocket, &event);
 }
 
-std::string MakeAnswer(std::size_t inBodySize) {
+std::string MakeAnswer(std::size_t inBodySize, const std::string& inCacheControl) {
     return "HTTP/1.1 200 OK\r\nContent-Type: application/json\r\nETag: \"5d8c72a5edda8d6a\"\r\n"
-           "Cache-Control: no-cache\r\nServer: bench\r\nContent-Length: " +
-           std::to_string(inBodySize) + "\r\n\r\n" + std::string(inBodySize, 'b');
+           "Cache-Control: " +
+           inCacheControl + "\r\nServer: bench\r\nContent-Length: " + std::to_string(inBodySize) +
+           "\r\n\r\n" + std::string(inBodySize, 'b');
 }
 
 /// Answers the whole requests in the buffer. False when the client is gone.
@@ -48,9 +49,8 @@ bool AnswerAll(int inSocket, std::string& ioBuffer, const std::string& inAnswer)
     return true;
 }
 
-[[noreturn]] void Serve(int inListener, std::size_t inBodySize) {
+[[noreturn]] void Serve(int inListener, const std::string& inAnswer) {
     prctl(PR_SET_PDEATHSIG, SIGKILL);
-    const std::string answer = MakeAnswer(inBodySize);
     const int epoll = epoll_create1(EPOLL_CLOEXEC);
     Watch(epoll, inListener);
     std::unordered_map<int, std::string> buffers;
@@ -72,7 +72,7 @@ bool AnswerAll(int inSocket, std::string& ioBuffer, const std::string& inAnswer)
             if (size > 0) {
                 buffer.append(bytes.data(), static_cast<std::size_t>(size));
             }
-            if (size <= 0 || !AnswerAll(socket, buffer, answer)) {
+            if (size <= 0 || !AnswerAll(socket, buffer, inAnswer)) {
                 close(socket);
                 buffers.erase(socket);
             }
@@ -82,7 +82,7 @@ bool AnswerAll(int inSocket, std::string& ioBuffer, const std::string& inAnswer)
 
 }  // namespace
 
-BenchmarkServer::BenchmarkServer(std::size_t inBodySize) {
+BenchmarkServer::BenchmarkServer(std::size_t inBodySize, const char* inCacheControl) {
     const int listener = socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0);
     sockaddr_in address{};
     address.sin_family = AF_INET;
@@ -97,7 +97,7 @@ BenchmarkServer::BenchmarkServer(std::size_t inBodySize) {
     mPort = ntohs(address.sin_port);
     mProcess = fork();
     if (mProcess == 0) {
-        Serve(listener, inBodySize);
+        Serve(listener, MakeAnswer(inBodySize, inCacheControl));
     }
     close(listener);
     if (mProcess < 0) {

@@ -8,10 +8,11 @@
 
 namespace bench {
 
-/// Answers every GET on every connection with a body of one size. Made before any thread of the client.
+/// Answers every GET on every connection with a body of one size, a tag, and a word on how long that may be
+/// kept. Made before any thread of the client.
 class BenchmarkServer {
 public:
-    explicit BenchmarkServer(std::size_t inBodySize);
+    explicit BenchmarkServer(std::size_t inBodySize, const char* inCacheControl = "no-cache");
     ~BenchmarkServer();
     BenchmarkServer(const BenchmarkServer&) = delete;
     BenchmarkServer& operator=(const BenchmarkServer&) = delete;
