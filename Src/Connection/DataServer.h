@@ -193,6 +193,8 @@ public:
 
     // --- Payloads that are kept (DataServerContent.cpp).
 
+    /// What a payload of this server is kept under.
+    ImmutableString ContentKey(const ImmutableString& inContentID) const;
     /// Gets the inflated payload in a 200 response, or null when the cache could not give it.
     using ContentCompletion = function<void(const ResponseRef&)>;
 
@@ -253,7 +255,7 @@ private:
     int UseHeldContent(const StoredContent& inContent, const Payload& inStored, ResponseRef& outResponse);
     int UseHeldContentLater(const StoredContent& inContent, const Payload& inStored);
     void OnGetCachedContentComplete(const StoredContent& inContent, const Payload& inStored);
-    static void DropContent(const StoredContent& inContent);
+    void DropContent(const StoredContent& inContent);
     void CacheSimply(const ImmutableString& inContentID, const ResponseRef& inResponse);
     bool RequestContent(const ImmutableString& inContentID, const Guid& inRequestID,
                         const Completion& inCompletion, const ImmutableString& inURL);
@@ -297,6 +299,8 @@ private:
     /// PromptForRecoverableErrors runs.
     std::atomic<bool> mPromptActive{false};
     std::atomic<bool> mTokenLost{false};
+    /// A login of this server has been accepted before.
+    std::atomic<bool> mWasAccepted{false};
     std::atomic<bool> mReconnectActive{false};
     std::unordered_map<ImmutableString, InterfaceRef<IZOCProduction>> mProductionCache
         ZO_GUARDED_BY(IZOCDataServer::GetLock());

@@ -71,6 +71,11 @@ DataServer::DataServer()
                                     ostcore::threads::CreateCPUBoundExecutor("simple content cache"))
                               : nullptr) {}
 
+/// The cache outlives sign-ins and is shared by all hubs, so one hub must not be able to answer for another.
+ImmutableString DataServer::ContentKey(const ImmutableString& inContentID) const {
+    return inContentID.empty() ? inContentID : ImmutableString(mBaseURL.str() + "\n" + inContentID.str());
+}
+
 int DataServer::GetCachedContent(const ImmutableString& inContentID, const ContentCompletion& inCompletion,
                                  ResponseRef& outResponse, bool inImmediately) {
     if (inContentID.empty()) {
@@ -100,11 +105,12 @@ int DataServer::GetStoredContent(const ImmutableString& inContentID, const Conte
     }
     int result = kResultFailure;
     const InterfaceRef<DataServer> self(this);
-    for (const ImmutableString& name : cache->ListNames(inContentID)) {
+    const ImmutableString key = ContentKey(inContentID);
+    for (const ImmutableString& name : cache->ListNames(key)) {
         const StoredContent content{inContentID, name, cache, inCompletion};
         Payload stored;
         result = cache->Read(
-            inContentID, name,
+            key, name,
             [self, content](int, const Payload& inStored) {
                 const auto finish = [self, content, inStored] {
                     self->OnGetCachedContentComplete(content, inStored);
@@ -169,7 +175,7 @@ void DataServer::DropContent(const StoredContent& inContent) {
     ostcore::debug::Trace(
         Channel(), ostcore::debug::kTraceLevel_Error,
         "A payload of the content cache cannot be inflated and is dropped: " + inContent.contentID.str());
-    inContent.cache->Remove(inContent.contentID, inContent.name);
+    inContent.cache->Remove(ContentKey(inContent.contentID), inContent.name);
 }
 
 DataServer::ResponseRef DataServer::GetCachedContentSynchronous(const ImmutableString& inContentID,
@@ -211,7 +217,7 @@ DataServer::ResponseRef DataServer::CacheAndDecompressContent(const ImmutableStr
         CacheContent(inContentID, inResponse->payload);
     } else if (!inContentID.empty()) {
         if (const auto cache = GetContentCache()) {
-            cache->Write(inContentID, ContentName(), inResponse->payload);
+            cache->Write(ContentKey(inContentID), ContentName(), inResponse->payload);
         }
     }
     return inflated;
@@ -230,7 +236,7 @@ void DataServer::CacheSimply(const ImmutableString& inContentID, const ResponseR
 
 void DataServer::CacheContent(const ImmutableString& inContentID, const Payload& inPayload) {
     if (!mUseSimpleContentCache) {
-        CacheContentLater(inContentID, inPayload,
+        CacheContentLater(ContentKey(inContentID), inPayload,
                           [this](const function<void()>& inFunction) { return PostFunction(inFunction, 0); });
     }
 }

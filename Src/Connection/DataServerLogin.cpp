@@ -43,6 +43,11 @@ bool DataServer::TakeTokenFromResponse(const shared_ptr<ostnet::Response>& inRes
         }
         held = mCredentials.token;
     }
+    // What waited for the token leaves now, and must outlive a failure of the network as it did before; the
+    // rest of the sign-in goes past the chain.
+    if (!token.IsNull() && mWasAccepted) {
+        EnableRetries();
+    }
     mChain.authorization->SetAuthToken(held);
     return !token.IsNull();
 }
@@ -58,6 +63,7 @@ bool DataServer::VerifyAuthentication(const shared_ptr<ostnet::Response>& inResp
     if (isInResponse) {
         TakeTokenFromResponse(inResponse);
     }
+    mWasAccepted = true;
     EnableRetries();
     if (mBecomeLoggedIn && BecomeLoggedInServer()) {
         RememberLogin(GetLoginData());

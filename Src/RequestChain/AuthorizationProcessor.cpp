@@ -22,8 +22,17 @@ bool AuthorizationProcessor::MakeRequest(const Guid& inRequestID, PackedRequest 
     {
         ScopedLock lock(mMutex, "AuthorizationProcessor::MakeRequest");
         token = mToken;
+        mRequests.emplace(inRequestID, false);
     }
-    return SendWithToken(Request{std::move(inPacked), inCompletion, inRequestID}, token);
+    if (!SendWithToken(Request{std::move(inPacked), inCompletion, inRequestID}, token)) {
+        Forget(inRequestID);
+        return false;
+    }
+    // A cancel that came while the next layer did not know the request has found nothing there.
+    if (IsCancelled(inRequestID)) {
+        Next()->TryToCancelRequest(inRequestID);
+    }
+    return true;
 }
 
 bool AuthorizationProcessor::SendWithToken(const Request& inRequest, const ImmutableString& inToken) {
@@ -36,20 +45,23 @@ bool AuthorizationProcessor::SendWithToken(const Request& inRequest, const Immut
 void AuthorizationProcessor::OnCompleted(const Request& inRequest, const ImmutableString& inUsedToken,
                                          const Guid& inRequestID, const shared_ptr<Response>& inResponse) {
     if (!inResponse || inResponse->status != kStatusUnauthorized) {
+        Forget(inRequest.requestID);
         inRequest.completion(inRequestID, inResponse);
         return;
     }
-    enum class Verdict { kGiveBack, kSendAgain, kParked } verdict = Verdict::kParked;
+    enum class Verdict { kGiveBack, kCancelled, kSendAgain, kParked } verdict = Verdict::kParked;
     ImmutableString current;
     function<void()> notification;
     {
         ScopedLock lock(mMutex, "AuthorizationProcessor::CompletionFunction");
         current = mToken;
-        if (mToken.IsNull() || !mTokenNotification || inRequest.renewals >= kMaximumRenewals) {
+        const auto found = mRequests.find(inRequest.requestID);
+        if (found != mRequests.end() && found->second) {
+            verdict = Verdict::kCancelled;
+        } else if (mToken.IsNull() || !mTokenNotification || inRequest.renewals >= kMaximumRenewals) {
             verdict = Verdict::kGiveBack;
         } else if (inUsedToken != mToken) {
             verdict = Verdict::kSendAgain;
-            mInTransit.emplace(inRequest.requestID, false);
         } else {
             if (mState == State::kTokenHeld) {
                 notification = mTokenNotification;
@@ -61,7 +73,11 @@ void AuthorizationProcessor::OnCompleted(const Request& inRequest, const Immutab
     }
     switch (verdict) {
         case Verdict::kGiveBack:
+            Forget(inRequest.requestID);
             inRequest.completion(inRequestID, inResponse);
+            break;
+        case Verdict::kCancelled:
+            EndCancelled(inRequest);
             break;
         case Verdict::kSendAgain:
             SendAgain({inRequest, inUsedToken, inResponse}, current);
@@ -81,17 +97,15 @@ void AuthorizationProcessor::SetAuthToken(const ImmutableString& inToken) {
         parked.swap(mParked);
         mState = inToken.IsNull() ? State::kNoToken : State::kTokenHeld;
         mToken = inToken;
-        for (const ParkedRequest& entry : parked) {
-            mInTransit.emplace(entry.request.requestID, false);
-        }
     }
     std::vector<Ending> endings;
     for (const ParkedRequest& entry : parked) {
         if (!inToken.IsNull() && inToken != entry.token) {
             SendAgain(entry, inToken);
-        } else if (TakeCancelInTransit(entry.request.requestID)) {
+        } else if (IsCancelled(entry.request.requestID)) {
             EndCancelled(entry.request);
         } else {
+            Forget(entry.request.requestID);
             endings.push_back({entry.request.completion, entry.request.requestID, entry.response});
         }
     }
@@ -122,10 +136,9 @@ void AuthorizationProcessor::TryToCancelRequest(const Guid& inRequestID) {
     optional<ParkedRequest> parked;
     {
         ScopedLock lock(mMutex, "AuthorizationProcessor::TryToCancelRequest");
-        const auto inTransit = mInTransit.find(inRequestID);
-        if (inTransit != mInTransit.end()) {
-            inTransit->second = true;
-            return;
+        const auto request = mRequests.find(inRequestID);
+        if (request != mRequests.end()) {
+            request->second = true;
         }
         const auto found = std::find_if(mParked.begin(), mParked.end(), [&](const ParkedRequest& inParked) {
             return inParked.request.requestID == inRequestID;
@@ -144,37 +157,24 @@ void AuthorizationProcessor::TryToCancelRequest(const Guid& inRequestID) {
 
 void AuthorizationProcessor::SendAgain(const ParkedRequest& inParked, const ImmutableString& inToken) {
     const Guid& requestID = inParked.request.requestID;
-    bool isCancelled = false;
-    {
-        ScopedLock lock(mMutex, "AuthorizationProcessor::SendAgain");
-        const auto found = mInTransit.find(requestID);
-        isCancelled = found != mInTransit.end() && found->second;
-        if (isCancelled) {
-            mInTransit.erase(found);
-        }
-    }
-    if (isCancelled) {
+    if (IsCancelled(requestID)) {
         EndCancelled(inParked.request);
-        return;
-    }
-    const bool started = SendWithToken(inParked.request, inToken);
-    const bool wasCancelledMeanwhile = TakeCancelInTransit(requestID);
-    if (!started) {
+    } else if (!SendWithToken(inParked.request, inToken)) {
         EndWithRefusal(inParked);
-    } else if (wasCancelledMeanwhile) {
+    } else if (IsCancelled(requestID)) {
         Next()->TryToCancelRequest(requestID);
     }
 }
 
-bool AuthorizationProcessor::TakeCancelInTransit(const Guid& inRequestID) {
-    ScopedLock lock(mMutex, "AuthorizationProcessor::TakeCancelInTransit");
-    const auto found = mInTransit.find(inRequestID);
-    if (found == mInTransit.end()) {
-        return false;
-    }
-    const bool isCancelled = found->second;
-    mInTransit.erase(found);
-    return isCancelled;
+bool AuthorizationProcessor::IsCancelled(const Guid& inRequestID) const {
+    ScopedLock lock(mMutex, "AuthorizationProcessor::IsCancelled");
+    const auto found = mRequests.find(inRequestID);
+    return found != mRequests.end() && found->second;
+}
+
+void AuthorizationProcessor::Forget(const Guid& inRequestID) {
+    ScopedLock lock(mMutex, "AuthorizationProcessor::Forget");
+    mRequests.erase(inRequestID);
 }
 
 void AuthorizationProcessor::EndLater(std::vector<Ending> inEndings) {
@@ -192,10 +192,12 @@ void AuthorizationProcessor::EndLater(std::vector<Ending> inEndings) {
 }
 
 void AuthorizationProcessor::EndWithRefusal(const ParkedRequest& inParked) {
+    Forget(inParked.request.requestID);
     EndLater({Ending{inParked.request.completion, inParked.request.requestID, inParked.response}});
 }
 
 void AuthorizationProcessor::EndCancelled(const Request& inRequest) {
+    Forget(inRequest.requestID);
     EndLater({Ending{inRequest.completion, inRequest.requestID,
                      boost::make_shared<Response>(Response::kStatusCancelled)}});
 }

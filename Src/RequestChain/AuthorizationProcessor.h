@@ -1,7 +1,7 @@
 // Puts the login token on every request, and sees a request through the expiry of its token.
 #pragma once
 
-#include <map>
+#include <unordered_map>
 #include <vector>
 
 #include "ostcore/threads/RecursiveMutex.h"
@@ -20,9 +20,14 @@ namespace ZOCL {
 /// first refusal of the current token moves the state from kTokenHeld to kTokenAskedFor and asks; all
 /// others find the state moved. Hence one question for any number of refusals.
 ///
-/// Invariants: a request is in the hands of the next layer, parked, or in transit (taken out to be sent
-/// again) and in one of these only, so it completes once. The mutex is never held over the next layer, a
-/// completion or the notification.
+/// A cancel can come when a refusal is on its way up from the next layer, or the request on its way down to
+/// it, so that nobody below knows the request. So each request stands in mRequests from its start to its end,
+/// and a cancel leaves its mark there: a refusal of a marked request ends it, and what was sent again is
+/// cancelled below once its start has returned.
+///
+/// Invariants: a request is in the hands of the next layer, parked, or taken out to be sent again, and in one
+/// of these only, so it completes once. The mutex is never held over the next layer, a completion or the
+/// notification.
 ///
 /// Threads: any. Completions that this layer itself makes (a cancel, a refusal at the end) run on the workers
 /// of the base processor, never on the stack of the operation that caused them.
@@ -107,9 +112,10 @@ private:
     bool SendWithToken(const Request& inRequest, const ImmutableString& inToken);
     void OnCompleted(const Request& inRequest, const ImmutableString& inUsedToken, const Guid& inRequestID,
                      const shared_ptr<ostnet::Response>& inResponse);
-    /// Sends a request in transit again; cancels that came meanwhile are honoured.
+    /// Sends a request that was taken out again; cancels that came meanwhile are honoured.
     void SendAgain(const ParkedRequest& inParked, const ImmutableString& inToken);
-    bool TakeCancelInTransit(const Guid& inRequestID);
+    bool IsCancelled(const Guid& inRequestID) const;
+    void Forget(const Guid& inRequestID);
     void EndLater(std::vector<Ending> inEndings);
     void EndWithRefusal(const ParkedRequest& inParked);
     void EndCancelled(const Request& inRequest);
@@ -117,8 +123,8 @@ private:
     mutable ostcore::threads::RecursiveMutex mMutex;
     State mState ZO_GUARDED_BY(mMutex) = State::kNoToken;
     std::vector<ParkedRequest> mParked ZO_GUARDED_BY(mMutex);
-    /// Requests that are being sent again, each with whether it was cancelled meanwhile.
-    std::map<Guid, bool> mInTransit ZO_GUARDED_BY(mMutex);
+    /// From the start of each request to its end, with whether it was cancelled.
+    std::unordered_map<Guid, bool> mRequests ZO_GUARDED_BY(mMutex);
     ImmutableString mToken ZO_GUARDED_BY(mMutex);
     function<void()> mTokenNotification ZO_GUARDED_BY(mMutex);
 };

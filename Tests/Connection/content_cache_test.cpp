@@ -73,12 +73,12 @@ protected:
         ostcore::debug::DebugDatabase::ClearOverrides();
     }
     /// As the next process of the user would begin.
-    void NewRun() {
+    void NewRun(const std::string& inDiscovery = kDiscovery) {
         server = nullptr;
         net->WaitUntilIdle();
         ReleaseContentCache();
         DataServer::Settings settings;
-        settings.discoveryURL = ImmutableString(kDiscovery);
+        settings.discoveryURL = ImmutableString(inDiscovery);
         server = DataServer::Create(settings);
         net->ClearRequests();
     }
@@ -142,6 +142,16 @@ TEST_F(ContentCacheTest, APayloadIsFetchedOnceForAllRuns) {
     EXPECT_EQ(net->RequestCount(), 0u) << "the second run asks nobody";
 }
 
+TEST_F(ContentCacheTest, OneHubDoesNotAnswerForAnother) {
+    EXPECT_EQ(Get(), kText);
+    NewRun("http://other.example/content/zo/api/discovery.json");
+    net->SetHandler([](const RecordedRequest&) { return Packed("of the other hub"); });
+    EXPECT_EQ(Get(), "of the other hub");
+    NewRun();
+    EXPECT_EQ(Get(), kText);
+    EXPECT_EQ(net->RequestCount(), 0u);
+}
+
 TEST_F(ContentCacheTest, WhatThisClientHasWrittenAndWhatCameUnpackedIsKeptPacked) {
     server->CacheContent(kID, RecycledMemory::CreateFromBytes(kText));
     server->CacheContent(ImmutableString(), RecycledMemory::CreateFromBytes(kText));
@@ -188,8 +198,8 @@ TEST_F(ContentCacheTest, ADamagedOrUselessFileIsFetchedAgainOnce) {
                                     "asynchronously: content-id-1"));
     // Sound, but no gzip: as if another program had stored it.
     const auto storeNonsense = [&] {
-        ASSERT_TRUE(
-            GetContentCache()->Write(kID, ContentName(), RecycledMemory::CreateFromBytes("nonsense")));
+        ASSERT_TRUE(GetContentCache()->Write(server->ContentKey(kID), ContentName(),
+                                             RecycledMemory::CreateFromBytes("nonsense")));
         WaitForWrites();
     };
     storeNonsense();
