@@ -253,7 +253,8 @@ void RecoverableErrorProcessor::End(const shared_ptr<Request>& inRequest) {
     const auto complete = [inRequest] {
         CompletionFunction completion;
         completion.swap(inRequest->completion);
-        completion(inRequest->requestID, std::move(inRequest->response));
+        const shared_ptr<Response> response = std::move(inRequest->response);
+        completion(inRequest->requestID, response);
     };
     if (!PostFunction(complete, 0)) {
         complete();
