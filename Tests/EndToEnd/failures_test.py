@@ -52,7 +52,7 @@ class Failures(EndToEndTest):
         self.ends(ada.zo("productions"), OK)
 
     def test_an_expired_token(self):
-        hub = self.hub("--token-lifetime", "1")
+        hub = self.hub("--token-lifetime", "5")
         hub.add_user("ada", "secret")
         hub.start()
         ada = self.user()
