@@ -179,6 +179,10 @@ protected:
             true, true));
         return ended.get_future().get();
     }
+    /// A server that another has taken the place of is let go of by nobody else.
+    static void LetGoOf(const InterfaceRef<IZOCDataServer>& inServer) {
+        RFL::QueryInterface<DataServer>(inServer)->ReleaseCaches();
+    }
     /// Anna's session on the one production that there is, made when there is none.
     static InterfaceRef<IZOCEditingSession> OpenSession(const InterfaceRef<IZOCDataServer>& inServer) {
         const auto list = inServer->GetProductionList(true);
@@ -321,6 +325,7 @@ TEST_F(HubDeath, ACommitOfTheSameUserIsNotTakenForOnesOwn) {
     others = Change(OpenSession(elsewhere), "other text");
     EXPECT_EQ(Perform(Committing(transaction)).Wait(), kResultHTTPPreconditionFailed);
     EXPECT_EQ(CountChangesAtHub(false), 1);
+    LetGoOf(elsewhere);
 }
 
 TEST_F(HubDeath, AShareOfTheSameUserIsNotTakenForOnesOwn) {
@@ -340,6 +345,7 @@ TEST_F(HubDeath, AShareOfTheSameUserIsNotTakenForOnesOwn) {
               kResultSuccess);
     EXPECT_EQ(Perform(Sharing(session)).Wait(), kResultHTTPPreconditionFailed);
     EXPECT_EQ(CountChangesAtHub(true), 1);
+    LetGoOf(elsewhere);
 }
 
 }  // namespace

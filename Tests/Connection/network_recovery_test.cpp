@@ -289,6 +289,8 @@ TEST_F(NetworkRecovery, OfALoneRequestTheHeadlessLimitIsKeptToo) {
     Advance(seconds(4));
     Pump();
     EXPECT_EQ(ended, 1);
+    Advance(seconds(33));
+    EXPECT_EQ(failed, 1) << "with retries off it ends at its next failure";
 }
 
 TEST_F(NetworkRecovery, AChangeCarriesOneKeyThroughAllItsSendings) {

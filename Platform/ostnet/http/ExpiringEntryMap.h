@@ -151,8 +151,8 @@ private:
                 }
             }
             const std::size_t young = mEntries.size() - old.size();
-            const std::size_t kept =
-                std::min(old.size(), mLimits.maxEntries - std::min<std::size_t>(young, mLimits.maxEntries));
+            const std::size_t kept = (std::min)(
+                old.size(), mLimits.maxEntries - (std::min<std::size_t>)(young, mLimits.maxEntries));
             const auto firstDropped = old.begin() + static_cast<std::ptrdiff_t>(kept);
             std::nth_element(old.begin(), firstDropped, old.end(), [](auto inLeft, auto inRight) {
                 return inLeft->second.lastAccess > inRight->second.lastAccess;
