@@ -8,7 +8,6 @@
 #include "ostcore/threads/DelayedCall.h"
 #include "RequestChain/PackedRequest.h"
 #include "RequestChain/RepeatMark.h"
-#include "RequestChain/RepeatMark.h"
 
 namespace ZOCL {
 

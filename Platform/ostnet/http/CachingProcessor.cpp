@@ -73,7 +73,8 @@ CachingProcessor::CachingProcessor(shared_ptr<RequestProcessor> inNext)
 CachingProcessor::~CachingProcessor() = default;
 
 shared_ptr<CachingProcessor::ResponseCache> CachingProcessor::MakeCache() {
-    return boost::make_shared<ResponseCache>(kLimits, ostcore::threads::CreateCPUBoundExecutor("cache sweep"));
+    return boost::make_shared<ResponseCache>(kLimits,
+                                             ostcore::threads::CreateCPUBoundExecutor("cache sweep"));
 }
 
 bool CachingProcessor::GET(const Guid& inRequestID, const CompletionFunction& inCompletion,

@@ -188,8 +188,8 @@ bool NetworkProcessor::Core::Post(const function<void()>& inFunction, std::uint3
     return mDelayed->Add(inFunction, inDelayMilliseconds);
 }
 
-// A layer above may hold the request back, or send it under an ID of its own; so a worker that says that it is
-// about to block is replaced in any case.
+// A layer above may hold the request back, or send it under an ID of its own; so a worker that says that it
+// is about to block is replaced in any case.
 bool NetworkProcessor::Core::Waiting(const Guid& inRequestID) {
     const bool goesOn = mWorkers.AboutToBlock();
     MutexLock lock(mMutex);
