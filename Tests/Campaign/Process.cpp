@@ -5,11 +5,11 @@
 #include <poll.h>
 #include <signal.h>
 #include <spawn.h>
+#include <sys/syscall.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
 #include <stdexcept>
-#include <thread>
 
 extern char** environ;
 
@@ -122,14 +122,18 @@ void Process::Signal(int inSignal) {
 int Process::WaitForEnd(Milliseconds inPatience) {
     close(mInput);
     mInput = -1;
-    const Clock::time_point end = Clock::now() + inPatience;
-    int status = 0;
-    while (waitpid(mID, &status, WNOHANG) == 0) {
-        if (Clock::now() > end) {
-            throw ProcessFailure{Describe("does not end"), true};
-        }
-        std::this_thread::sleep_for(Milliseconds(2));
+    const int descriptor = static_cast<int>(syscall(SYS_pidfd_open, mID, 0));
+    if (descriptor < 0) {
+        throw ProcessFailure{Describe("cannot be waited for")};
     }
+    pollfd ended{descriptor, POLLIN, 0};
+    const bool hasEnded = poll(&ended, 1, static_cast<int>(inPatience.count())) == 1;
+    close(descriptor);
+    if (!hasEnded) {
+        throw ProcessFailure{Describe("does not end"), true};
+    }
+    int status = 0;
+    waitpid(mID, &status, 0);
     mID = -1;
     return WIFEXITED(status) ? WEXITSTATUS(status) : -WTERMSIG(status);
 }
