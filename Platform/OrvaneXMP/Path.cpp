@@ -10,6 +10,19 @@ namespace OrvaneXMP {
 
 namespace {
 
+/// The index of the item, or the number of items when none has this language.
+std::size_t IndexOfLanguage(Range<Node> inItems, std::string_view inLanguage) {
+    const auto found = std::find_if(inItems.begin(), inItems.end(), [&](const Node& inItem) {
+        const Node& language = inItem.QualifierNamed(LanguageName());
+        return language.IsPresent() && language.Value() == inLanguage;
+    });
+    return static_cast<std::size_t>(found - inItems.begin());
+}
+
+Node ItemAt(const Node& inArray, std::size_t inIndex) {
+    return inIndex < inArray.Items().size() ? inArray.Items()[inIndex] : Node();
+}
+
 Node Step(const Node& inNode, const PathStep& inStep) {
     switch (inStep.way) {
         case PathStep::Way::ToField:
@@ -17,7 +30,9 @@ Node Step(const Node& inNode, const PathStep& inStep) {
         case PathStep::Way::ToQualifier:
             return inNode.QualifierNamed(inStep.name);
         case PathStep::Way::ToItem:
-            return inStep.index < inNode.Items().size() ? inNode.Items()[inStep.index] : Node();
+            return ItemAt(inNode, inStep.index);
+        case PathStep::Way::ToLanguage:
+            return ItemAt(inNode, IndexOfLanguage(inNode.Items(), inStep.language));
     }
     return Node();
 }
@@ -48,6 +63,8 @@ Node With(const Node& inNode, const PathStep& inStep, const Node& inBelow) {
             return inNode.WithQualifier(inStep.name, inBelow);
         case PathStep::Way::ToItem:
             return WithItem(inNode, inStep.index, inBelow);
+        case PathStep::Way::ToLanguage:
+            return WithItem(inNode, IndexOfLanguage(inNode.Items(), inStep.language), inBelow);
     }
     return Node();
 }
@@ -101,6 +118,10 @@ std::string PathText(const Path& inPath, const Packet& inPacket) {
     for (const PathStep& step : inPath) {
         if (step.way == PathStep::Way::ToItem) {
             text += "[" + std::to_string(step.index + 1) + "]";
+            continue;
+        }
+        if (step.way == PathStep::Way::ToLanguage) {
+            text += "[?xml:lang=\"" + step.language + "\"]";
             continue;
         }
         text += text.empty() ? "" : "/";
