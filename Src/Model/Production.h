@@ -99,6 +99,8 @@ public:
     bool Commit(const Guid& inRequestID, const RequestCompletion& inCompletion,
                 const UString& inMessage) override;
     bool Rollback(const Guid& inRequestID, const RequestCompletion& inCompletion) override;
+    InterfaceRef<IZOCBulkTransaction> CreateBulkTransaction(
+        const shared_ptr<CompoundAsyncOperation>& inParentOperation) override;
 
     // --- For code of this floor.
 

@@ -13,6 +13,7 @@
 #include "ostcore/utility/StringConversion.h"
 #include "Relations.h"
 #include "RequestChain/RepeatMark.h"
+#include "ZOClient/IZOCBulkTransaction.h"
 
 namespace ZOCL {
 
@@ -297,6 +298,11 @@ bool Production::StoreProductionChangesInTransaction(const InterfaceRef<IZOCTran
     }
     PutBackPropertyChanges(changes);
     return false;
+}
+
+InterfaceRef<IZOCBulkTransaction> Production::CreateBulkTransaction(
+    const shared_ptr<CompoundAsyncOperation>& /*inParentOperation*/) {
+    return nullptr;
 }
 
 }  // namespace ZOCL

@@ -92,6 +92,9 @@ public:
     /// try.
     virtual bool StoreProductionChangesInTransaction(const InterfaceRef<IZOCTransaction>& inTransaction,
                                                      const ResultCompletion& inCompletion) = 0;
+    /// The same operation as that of IZOCTransaction: null on a session that is no transaction.
+    virtual InterfaceRef<IZOCBulkTransaction> CreateBulkTransaction(
+        const shared_ptr<CompoundAsyncOperation>& inParentOperation) = 0;
 };
 
 /// Gets all sessions of a production that this user may see, each loaded: the list first, then every session.

@@ -10,6 +10,9 @@
 
 namespace ZOCL {
 
+class CompoundAsyncOperation;
+class IZOCBulkTransaction;
+
 /// "edit": changes by hand, for which others wait.
 ZOCL_EXPORT extern const ImmutableString kTransactionType_Edit;
 /// "ingest": only adds, and never blocks others.
@@ -55,6 +58,13 @@ public:
                         const UString& inMessage) = 0;
     /// Drops the changes; the transaction is gone then.
     virtual bool Rollback(const Guid& inRequestID, const RequestCompletion& inCompletion) = 0;
+    /// Gathers many changes of this transaction and sends them as a few requests, which together count as one
+    /// request of the parent operation (IZOCBulkTransaction.h). Null: make the changes one by one. It is null
+    /// on an object that is no transaction, when the server does not take changes in bulk, when the switch
+    /// "ZOClient.EnableBulkAPI" is off, when the parent operation is null or has failed, and as long as an
+    /// earlier one of this object has not ended.
+    virtual InterfaceRef<IZOCBulkTransaction> CreateBulkTransaction(
+        const shared_ptr<CompoundAsyncOperation>& inParentOperation) = 0;
 };
 
 /// The open transactions of a session. Loaded as any resource: the object answers IZOCServerResource.
