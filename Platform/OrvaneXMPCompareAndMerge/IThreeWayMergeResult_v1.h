@@ -25,9 +25,10 @@ enum class DecisionCause : std::int32_t {
     Unresolved = 5
 };
 
-/// One decision about a node, or about all that lies below it.
+/// One decision about a node and all that lies below it. That of an array whose qualifiers were decided each
+/// for itself is about its items alone.
 struct Decision {
-    Path path;
+    SharedPath path;
     DecisionCause cause;
     ResolvedSource source;
     /// True when the node is not in the result.

@@ -20,7 +20,7 @@ public:
         const ostcore::shared_ptr<IThreeWayConflictResolutionStrategy_v1>& inStrategy) = 0;
 
     /// Never null. Nodes that a side left alone are shared with the arguments, not copied. Throws
-    /// std::bad_alloc alone.
+    /// std::invalid_argument for properties that are no structure without qualifiers, and std::bad_alloc.
     virtual RFL::InterfaceRef<IThreeWayMergeResult_v1> Merge(const Packet& inBase, const Packet& inLatest,
                                                              const Packet& inUser) = 0;
 

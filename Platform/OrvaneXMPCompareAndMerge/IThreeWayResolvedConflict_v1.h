@@ -13,7 +13,7 @@ class ZOPLATFORM_EXPORT IThreeWayResolvedConflict_v1 : public RFL::RFLUnknown {
 public:
     static constexpr RFL::InterfaceID kInterfaceID{0x6f586d705265736full, 0x6c76656443660001ull};
 
-    virtual const Path& GetPath() const noexcept = 0;
+    virtual Path GetPath() const = 0;
     virtual NodeType GetNodeType() const noexcept = 0;
     virtual ConflictReason GetReason() const noexcept = 0;
     /// As the strategy gave them. An absent node was taken out.

@@ -12,7 +12,7 @@ class ZOPLATFORM_EXPORT IThreeWayUnResolvedConflict_v1 : public RFL::RFLUnknown 
 public:
     static constexpr RFL::InterfaceID kInterfaceID{0x6f586d70556e5265ull, 0x736f6c7643660001ull};
 
-    virtual const Path& GetPath() const noexcept = 0;
+    virtual Path GetPath() const = 0;
     virtual NodeType GetNodeType() const noexcept = 0;
     virtual ConflictReason GetReason() const noexcept = 0;
     virtual bool IsInArrayOrStruct() const noexcept = 0;

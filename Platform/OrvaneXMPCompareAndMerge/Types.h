@@ -1,10 +1,13 @@
 // The words of the three-way merge: what conflicts, why, and from where a value came.
 #pragma once
 
+#include <cstddef>
 #include <cstdint>
 
 #include "OrvaneXMP/Path.h"
 #include "OrvaneXMP/Tree.h"
+#include "ostcore/Export.h"
+#include "ostcore/Types.h"
 
 namespace OrvaneXMPCompareAndMerge {
 
@@ -34,6 +37,22 @@ enum class ResolvedSource : std::int32_t { Base = 1, Latest = 2, User = 3, New =
 constexpr std::int32_t kResolved = 0;
 /// The status of a conflict that a strategy resolved.
 constexpr std::int32_t kResolvedStatus_ByStrategy = 0x7FFFFFFE;
+
+/// A path that shares its beginning with others, so that many paths into one deep tree stay small. It is used
+/// as a Path. Immutable; the default one has no step. Threads: as a shared_ptr to a constant.
+class ZOPLATFORM_EXPORT SharedPath {
+public:
+    SharedPath() noexcept = default;
+    /// The path with one step more.
+    SharedPath Below(const OrvaneXMP::PathStep& inStep) const;
+    /// The number of steps.
+    std::size_t size() const noexcept;
+    operator Path() const;
+
+private:
+    struct Link;
+    ostcore::shared_ptr<const Link> mLast;
+};
 
 /// One side's node of a conflict, and the whole packet that it is part of. The node is absent when the
 /// property does not exist on that side. Valid as long as the call that was given it.
