@@ -6,6 +6,7 @@
 #include "Frame/Station.h"
 #include "Frame/SyslogLogger.h"
 #include "Model/ModelResourceFactory.h"
+#include "OrvaneXMPCompareAndMerge/Library.h"
 #include "ostcore/threads/MainThread.h"
 #include "ostnet/http/NetworkProcessor.h"
 #include "PollCancellation.h"
@@ -31,6 +32,7 @@ void Initialize() {
     ostcore::threads::SetMainThread();
     ostnet::Startup();
     RegisterStation();
+    OrvaneXMPCompareAndMerge::StartLibrary();
     GetCompositionRoot().resources = GetModelResourceFactory();
     GetCompositionRoot().collaboration = GetCollaborationFactory();
     GetCompositionRoot().polls = GetPollCancellation();
@@ -43,6 +45,7 @@ void Shutdown() {
     StopAutoAuthentication();
     ResetSyslogLogger();
     SetCurrentZOSandbox(nullptr);
+    OrvaneXMPCompareAndMerge::EndLibrary();
     // Before the network goes, which the polls use.
     PollingResourceMonitor::CancelAllOutstandingPolls(true);
     // The network's last completions still make resources, so the factory goes after it.
