@@ -57,6 +57,9 @@ constexpr Row kRows[] = {
     {"/transactions", "", "/zo/1/p/*/transactions"},
     {"/transactions/transaction#commit", "", "/zo/1/p/*/commit"},
     {"/transactions/transaction#rollback", "", "/zo/1/p/*/rollback"},
+    {"/bulk#create", "", "/zo/1/p/*/bulk/create"},
+    {"/bulk#edit", "", "/zo/1/p/*/bulk/edit"},
+    {"/bulk#delete", "", "/zo/1/p/*/bulk/delete"},
     {"accept-theirs", "", "/zo/1/p/*/accept-theirs"},
     {"accept-yours", "", "/zo/1/p/*/accept-yours"},
 };

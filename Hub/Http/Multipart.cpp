@@ -8,7 +8,6 @@ namespace zohub {
 
 namespace {
 
-constexpr std::size_t kMaxParts = 20000;
 constexpr std::size_t kMaxPartHead = 8 * 1024;
 
 [[noreturn]] void FailMalformed(std::string const& inWhy) {
@@ -50,7 +49,7 @@ std::string ParameterOf(std::string_view inValue, std::string_view inName) {
 
 }  // namespace
 
-Form::Form(Request const& inRequest) {
+Form::Form(Request const& inRequest, std::size_t inMaxParts) : mMaxParts(inMaxParts) {
     std::string_view const type = inRequest.Header("Content-Type");
     std::string const plainType = ToLower(Trim(Split(type, ';')[0]));
     if (plainType == "application/x-www-form-urlencoded") {
@@ -67,9 +66,10 @@ Form::Form(Request const& inRequest) {
 
 void Form::ReadMultipart(std::string_view inBody, std::string const& inBoundary) {
     std::string const delimiter = "--" + inBoundary;
+    std::string const lineAndDelimiter = "\r\n" + delimiter;
     std::size_t at = 0;
     if (inBody.substr(0, delimiter.size()) != delimiter) {
-        at = inBody.find("\r\n" + delimiter);
+        at = inBody.find(lineAndDelimiter);
         if (at == std::string_view::npos)
             FailMalformed("the boundary does not occur in the body");
         at += 2;
@@ -83,14 +83,20 @@ void Form::ReadMultipart(std::string_view inBody, std::string const& inBoundary)
             FailMalformed("a boundary line has more than the boundary");
         std::size_t const begin = lineEnd + 2;
         // An empty part head may share its line end with the boundary before it.
-        std::size_t const end = inBody.find("\r\n" + delimiter, begin);
+        std::size_t const end = inBody.find(lineAndDelimiter, begin);
         if (end == std::string_view::npos)
             FailMalformed("the closing boundary is missing");
-        if (mParts.size() >= kMaxParts)
-            throw Failure(413, "form-too-many-parts", "The form has more parts than this server accepts.");
+        RequireRoomForPart();
         ReadPart(inBody.substr(begin, end - begin));
         at = end + 2;
     }
+}
+
+void Form::RequireRoomForPart() const {
+    if (mParts.size() >= mMaxParts)
+        throw Failure(413, "form-too-many-parts",
+                      "The form has more parts than the " + std::to_string(mMaxParts) +
+                          " that this server accepts here.");
 }
 
 void Form::ReadPart(std::string_view inPart) {
@@ -125,8 +131,7 @@ void Form::ReadUrlEncoded(std::string_view inBody) {
     for (auto pair : Split(inBody, '&')) {
         if (pair.empty())
             continue;
-        if (mParts.size() >= kMaxParts)
-            throw Failure(413, "form-too-many-parts", "The form has more fields than this server accepts.");
+        RequireRoomForPart();
         std::string text(pair);
         for (char& c : text)
             if (c == '+')

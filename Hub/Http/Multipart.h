@@ -15,11 +15,14 @@ struct FormPart {
     std::string_view bytes;  ///< inside the form's own memory
 };
 
+inline constexpr std::size_t kMaxFormParts = 20000;
+
 /// The fields of a form in the order in which they came.
 class Form {
 public:
-    /// Throws Failure 400 for a damaged form and 415 for a body that is no form. The request must outlive it.
-    explicit Form(Request const& inRequest);
+    /// Throws Failure 400 for a damaged form, 413 for too many parts and 415 for a body that is no form. The
+    /// request must outlive it.
+    explicit Form(Request const& inRequest, std::size_t inMaxParts = kMaxFormParts);
     Form(Form const&) = delete;
     Form& operator=(Form const&) = delete;
 
@@ -32,7 +35,9 @@ private:
     void ReadMultipart(std::string_view inBody, std::string const& inBoundary);
     void ReadPart(std::string_view inPart);
     void ReadUrlEncoded(std::string_view inBody);
+    void RequireRoomForPart() const;
 
+    std::size_t const mMaxParts;
     std::vector<FormPart> mParts;
     std::vector<std::unique_ptr<std::string>> mDecoded;
 };

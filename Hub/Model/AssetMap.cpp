@@ -101,6 +101,21 @@ public:
         return StoreEntries(std::move(node.entries), inDepth);
     }
 
+    void Find(std::string const& inHash, Steps const& inSteps, std::size_t inDepth,
+              std::map<std::string, std::string>& ioFound) const {
+        Node const node = Load(inHash);
+        if (!node.isFork) {
+            for (auto const& step : inSteps)
+                if (auto const entry = node.entries.find(*step.id); entry != node.entries.end())
+                    ioFound.insert(*entry);
+            return;
+        }
+        auto const parts = PartsOf(inSteps, inDepth);
+        for (std::size_t digit = 0; digit < parts.size(); ++digit)
+            if (!parts[digit].empty() && node.branches[digit].count != 0)
+                Find(node.branches[digit].hash, parts[digit], inDepth + 1, ioFound);
+    }
+
     void Collect(std::string const& inHash, std::map<std::string, std::string>& ioEntries) const {
         Node node = Load(inHash);
         ioEntries.merge(node.entries);
@@ -117,10 +132,16 @@ public:
     }
 
 private:
-    Branch ApplyToFork(Node inNode, Steps const& inSteps, std::size_t inDepth) {
+    // One part for each branch of a fork.
+    static std::array<Steps, 16> PartsOf(Steps const& inSteps, std::size_t inDepth) {
         std::array<Steps, 16> parts;
         for (auto const& step : inSteps)
             parts[DigitAt(step.keyHash, inDepth)].push_back(step);
+        return parts;
+    }
+
+    Branch ApplyToFork(Node inNode, Steps const& inSteps, std::size_t inDepth) {
+        auto const parts = PartsOf(inSteps, inDepth);
         std::uint64_t total = 0;
         for (std::size_t digit = 0; digit < parts.size(); ++digit) {
             Branch& branch = inNode.branches[digit];
@@ -248,6 +269,17 @@ std::optional<std::string> AssetMap::Find(std::string const& inAssetId) const {
         at = branch.count ? branch.hash : std::string();
     }
     return std::nullopt;
+}
+
+std::map<std::string, std::string> AssetMap::FindAll(std::vector<std::string> const& inAssetIds) const {
+    std::map<std::string, std::string> found;
+    Steps steps;
+    steps.reserve(inAssetIds.size());
+    for (auto const& id : inAssetIds)
+        steps.push_back({&id, nullptr, Sha256Hex(id)});
+    if (!mRoot.empty() && !steps.empty())
+        Writer(mTransaction).Find(mRoot, steps, 0, found);
+    return found;
 }
 
 std::map<std::string, std::string> AssetMap::All() const {

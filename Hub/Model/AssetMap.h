@@ -22,6 +22,9 @@ public:
 
     std::optional<std::string> Find(std::string const& inAssetId) const;
 
+    /// The states of those of the assets that are there. Reads each part of the map once.
+    std::map<std::string, std::string> FindAll(std::vector<std::string> const& inAssetIds) const;
+
     /// All entries, in no order that means something.
     std::map<std::string, std::string> All() const;
 

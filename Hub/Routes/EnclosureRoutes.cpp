@@ -4,13 +4,15 @@
 #include "Base/Text.h"
 #include "Http/Multipart.h"
 #include "Routes/ItemOwner.h"
+#include "Routes/ItemRules.h"
 
 namespace zohub {
 
 namespace {
 
-constexpr std::size_t kMaxEnclosures = 1000;
-constexpr char kDefaultType[] = "application/octet-stream";
+ItemData DataOf(Payload const& inPayload) {
+    return {inPayload.bytes, inPayload.type, inPayload.hash};
+}
 
 Response EnclosureResponse(Call& ioCall, ItemOwner const& inOwner, EnclosureState const& inEnclosure,
                            int inStatus) {
@@ -45,23 +47,12 @@ Payload PreparePayload(Request const& inRequest) {
 Response CreateEnclosure(Call& ioCall, OwnerKind inKind) {
     ItemOwner owner = ItemOwner::ForWriting(ioCall, inKind);
     Payload const& payload = ioCall.payload;
-    EnclosureState enclosure;
-    enclosure.id = NewKey(kShortKey);
-    enclosure.name = std::string(payload.form->Get(":name").bytes);
-    if (!IsEnclosureName(enclosure.name))
-        throw Failure(
-            400, "name-invalid",
-            "An enclosure's name is 1 to 1024 bytes of UTF-8 without control characters, backslashes, a "
-            "leading slash or \"..\".");
+    EnclosureState enclosure = NewEnclosure(payload.form->Get(":name").bytes, DataOf(payload));
     for (auto const& other : owner.Enclosures())
         if (other.name == enclosure.name)
-            throw Failure(409, "enclosure-exists",
-                          "There is an enclosure of that name already; write to its edit address instead.");
-    if (owner.Enclosures().size() >= kMaxEnclosures)
-        throw Failure(413, "too-many-enclosures", "No more enclosures can be put here; remove some first.");
-    enclosure.type = payload.type.empty() ? kDefaultType : payload.type;
-    enclosure.size = payload.bytes.size();
-    enclosure.content = payload.hash;
+            FailEnclosureExists();
+    RequireRoomForEnclosure(owner.Enclosures().size(),
+                            inKind.isAsset ? kMaxEnclosuresOfAsset : kMaxEnclosuresOfProduction);
     ioCall.repository.AddContent(payload.hash, payload.bytes);
     enclosure.isNote = owner.TakesNotes();
     owner.Enclosures().push_back(enclosure);
@@ -77,10 +68,7 @@ Response PutEnclosure(Call& ioCall, OwnerKind inKind) {
     Payload const& payload = ioCall.payload;
     if (payload.hash != enclosure.content) {
         ioCall.repository.AddContent(payload.hash, payload.bytes);
-        enclosure.content = payload.hash;
-        enclosure.size = payload.bytes.size();
-        if (!payload.type.empty())
-            enclosure.type = payload.type;
+        SetData(enclosure, DataOf(payload));
         owner.Commit(ioCall, "Changed an enclosure");
     }
     return EnclosureResponse(ioCall, owner, enclosure, 200);

@@ -138,6 +138,7 @@ Hub::Hub(Storage& inStorage, HubSettings inSettings, Clock inClock)
     AddLocatorRoutes(routes);
     AddSessionRoutes(routes);
     AddTransactionRoutes(routes);
+    AddBulkRoutes(routes);
     AddHistoryRoutes(routes);
     AddDifferenceRoutes(routes);
     AddAcceptRoutes(routes);

@@ -17,6 +17,8 @@
 
 namespace zohub {
 
+struct BulkForm;
+
 struct HubSettings {
     std::string id;  ///< of this hub, stable over its life
     std::string name = "zohub";
@@ -32,6 +34,7 @@ struct Payload {
     std::string_view bytes;            ///< in the request's body
     std::string type;                  ///< media type as the client stated it, or empty
     std::string hash;
+    std::shared_ptr<BulkForm const> bulk = nullptr;  ///< all of it, for the routes of bulk forms
 };
 
 /// One request on its way through a route, inside its database transaction.
@@ -58,7 +61,7 @@ struct Route {
     std::string method;
     std::string pattern;  ///< "p/{}/a"; {} stands for one segment
     SignIn signIn = SignIn::Needed;
-    std::function<Response(Call&)> handle;
+    std::function<Response(Call&)> handle = nullptr;
     std::function<Payload(Request const&)> prepare = nullptr;
 };
 

@@ -32,7 +32,11 @@ ItemOwner ItemOwner::ForWriting(Call& ioCall, OwnerKind inKind) {
         RequireManager(view);
     else
         RequireWritable(view);
-    return ItemOwner(ioCall, inKind, std::move(view));
+    ItemOwner owner(ioCall, inKind, std::move(view));
+    if (!inKind.isAsset)
+        for (auto const& enclosure : owner.mView.tree.enclosures)
+            owner.mContentsBefore.insert(enclosure.content);
+    return owner;
 }
 
 void ItemOwner::LoadNotes(Transaction& inTransaction) {
@@ -76,7 +80,8 @@ void ItemOwner::Commit(Call& ioCall, std::string const& inTitle) {
         edit.assets[mAsset.id] = ioCall.repository.AddAsset(scope, mAsset);
     } else {
         for (auto const& enclosure : mView.tree.enclosures)
-            ioCall.repository.AddEnclosureReference(scope, enclosure);
+            if (!mContentsBefore.count(enclosure.content))
+                ioCall.repository.AddEnclosureReference(scope, enclosure);
         edit.enclosures = mView.tree.enclosures;
     }
     ioCall.repository.CommitEdit(mView, edit, inTitle, ioCall.actor, ioCall.now);

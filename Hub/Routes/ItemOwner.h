@@ -3,6 +3,8 @@
 // the notes can be written there, and no commit is made of them.
 #pragma once
 
+#include <unordered_set>
+
 #include "Routes/Documents.h"
 #include "Routes/RouteTable.h"
 
@@ -49,7 +51,8 @@ private:
     bool const mIsAsset;
     View mView;
     AssetState mAsset;
-    std::vector<NoteRecord> mNotes;  // as they were loaded
+    std::vector<NoteRecord> mNotes;                   // as they were loaded
+    std::unordered_set<std::string> mContentsBefore;  // of the production, which lists them already
     std::string mApi;
 };
 

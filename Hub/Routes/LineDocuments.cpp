@@ -101,6 +101,9 @@ void DocumentWriter::WriteTransactionLinks(LinkWriter& ioLinks) const {
         return;
     ioLinks.Named("/transactions/transaction#commit", mLivePrefix + "/commit");
     ioLinks.Named("/transactions/transaction#rollback", mLivePrefix + "/rollback");
+    ioLinks.Named("/bulk#create", mLivePrefix + "/bulk/create");
+    ioLinks.Named("/bulk#edit", mLivePrefix + "/bulk/edit");
+    ioLinks.Named("/bulk#delete", mLivePrefix + "/bulk/delete");
 }
 
 void DocumentWriter::AppendLineLinks(std::string& ioTarget) const {

@@ -3,12 +3,11 @@
 #include "Base/Error.h"
 #include "Base/Text.h"
 #include "Routes/ItemOwner.h"
+#include "Routes/ItemRules.h"
 
 namespace zohub {
 
 namespace {
-
-constexpr std::size_t kMaxRenditions = 100;
 
 Response RenditionResponse(Call& ioCall, ItemOwner const& inOwner, RenditionState const& inRendition,
                            int inStatus) {
@@ -46,15 +45,14 @@ std::string FlavourOf(Request const& inRequest) {
     return type;
 }
 
+ItemData DataOf(Call const& inCall) {
+    return {inCall.request.body, FlavourOf(inCall.request), inCall.payload.hash};
+}
+
 Response CreateRendition(Call& ioCall, OwnerKind inKind) {
     ItemOwner owner = ItemOwner::ForWriting(ioCall, inKind);
-    if (owner.Renditions().size() >= kMaxRenditions)
-        throw Failure(413, "too-many-renditions", "No more renditions can be put here; remove some first.");
-    RenditionState rendition;
-    rendition.id = NewKey(kShortKey);
-    rendition.type = FlavourOf(ioCall.request);
-    rendition.size = ioCall.request.body.size();
-    rendition.content = ioCall.payload.hash;
+    RequireRoomForRendition(owner.Renditions().size());
+    RenditionState const rendition = NewRendition(DataOf(ioCall));
     ioCall.repository.AddContent(ioCall.payload.hash, ioCall.request.body);
     owner.Renditions().push_back(rendition);
     owner.Commit(ioCall, "Added a rendition");
@@ -79,13 +77,10 @@ Response PutMedia(Call& ioCall, OwnerKind inKind) {
     if (!IfMatchHolds(ioCall.request, "\"" + rendition.content + "\""))
         RequireMatch(ioCall.request, DocumentWriter(ioCall.api, owner.GetView()).RenditionTag(rendition),
                      "The rendition");
-    std::string const& content = ioCall.payload.hash;
-    std::string const type = FlavourOf(ioCall.request);
-    ioCall.repository.AddContent(content, ioCall.request.body);
-    if (content != rendition.content || type != rendition.type) {
-        rendition.content = content;
-        rendition.type = type;
-        rendition.size = ioCall.request.body.size();
+    ItemData const data = DataOf(ioCall);
+    ioCall.repository.AddContent(data.hash, data.bytes);
+    if (data.hash != rendition.content || data.type != rendition.type) {
+        SetData(rendition, data);
         owner.Commit(ioCall, "Changed a rendition");
     }
     return RenditionResponse(ioCall, owner, rendition, 200);

@@ -14,6 +14,7 @@ void AddRenditionRoutes(std::vector<Route>& ioRoutes);
 void AddLocatorRoutes(std::vector<Route>& ioRoutes);
 void AddSessionRoutes(std::vector<Route>& ioRoutes);
 void AddTransactionRoutes(std::vector<Route>& ioRoutes);
+void AddBulkRoutes(std::vector<Route>& ioRoutes);
 void AddHistoryRoutes(std::vector<Route>& ioRoutes);
 void AddDifferenceRoutes(std::vector<Route>& ioRoutes);
 void AddAcceptRoutes(std::vector<Route>& ioRoutes);
@@ -34,6 +35,10 @@ void RequireWritable(View const& inView);
 /// As OpenView, live: the actor's own session, with an If-Match of the request looked at. Throws Failure 404
 /// for another line, 403 for another user, 412.
 View OpenSession(Call& ioCall);
+
+/// As OpenView, live: an open transaction of the actor's own, with an If-Match of the request looked at.
+/// Throws Failure 404 for another line, 403 for another user, 409 for one that has ended, 412.
+View OpenTransaction(Call& ioCall);
 
 /// Throws Failure 403 unless the session is the actor's own.
 void RequireManager(View const& inSession);

@@ -64,7 +64,27 @@ Response CreateTransaction(Call& ioCall) {
     return LineResponse(ioCall, transaction, 201);
 }
 
-View OpenToEnd(Call& ioCall) {
+Response CommitTransaction(Call& ioCall) {
+    Json const body = ParseJsonObject(ioCall.request.body, "The body of the commit");
+    CheckKeys(body, {{":resolveStrategy", JsonKind::String}, {":commitMessage", JsonKind::String}},
+              "the body of the commit");
+    ResolveStrategy const strategy = ReadResolveStrategy(StringUnder(body, ":resolveStrategy"));
+    std::string const title = CheckedMessage(StringUnder(body, ":commitMessage"));
+    View transaction = OpenTransaction(ioCall);
+    View const session = Sessions(ioCall.transaction, ioCall.actor, ioCall.now)
+                             .CommitTransaction(transaction, strategy, title);
+    return LineResponse(ioCall, session, 200);
+}
+
+Response RollBack(Call& ioCall) {
+    View const transaction = OpenTransaction(ioCall);
+    Sessions(ioCall.transaction, ioCall.actor, ioCall.now).Discard(transaction);
+    return EmptyResponse(204);
+}
+
+}  // namespace
+
+View OpenTransaction(Call& ioCall) {
     View transaction = OpenView(ioCall, false);
     if (!transaction.IsTransaction())
         throw Failure(404, "not-found", "This address is there for transactions only.");
@@ -72,26 +92,6 @@ View OpenToEnd(Call& ioCall) {
     RequireMatch(ioCall.request, DocumentWriter(ioCall.api, transaction).ProductionTag(), "The transaction");
     return transaction;
 }
-
-Response CommitTransaction(Call& ioCall) {
-    Json const body = ParseJsonObject(ioCall.request.body, "The body of the commit");
-    CheckKeys(body, {{":resolveStrategy", JsonKind::String}, {":commitMessage", JsonKind::String}},
-              "the body of the commit");
-    ResolveStrategy const strategy = ReadResolveStrategy(StringUnder(body, ":resolveStrategy"));
-    std::string const title = CheckedMessage(StringUnder(body, ":commitMessage"));
-    View transaction = OpenToEnd(ioCall);
-    View const session = Sessions(ioCall.transaction, ioCall.actor, ioCall.now)
-                             .CommitTransaction(transaction, strategy, title);
-    return LineResponse(ioCall, session, 200);
-}
-
-Response RollBack(Call& ioCall) {
-    View const transaction = OpenToEnd(ioCall);
-    Sessions(ioCall.transaction, ioCall.actor, ioCall.now).Discard(transaction);
-    return EmptyResponse(204);
-}
-
-}  // namespace
 
 void AddTransactionRoutes(std::vector<Route>& ioRoutes) {
     std::string const line = std::string(kApiPath) + "/p/{}";
