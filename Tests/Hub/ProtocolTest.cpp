@@ -134,13 +134,13 @@ private:
 
     void Capture(Answer const& inAnswer, std::string const& inLine) {
         std::istringstream words(inLine);
-        std::string name, kind, what, where;  // a JSON pointer to the object that has the link
+        std::string name, kind, what, where;  // a JSON pointer to the object that has it
         words >> name >> kind >> what >> where;
         std::string value;
         if (kind == "link")
             value = LinkOf(Json::parse(inAnswer.body).at(Json::json_pointer(where)), what);
         else if (kind == "member")
-            value = Json::parse(inAnswer.body).at(what).get<std::string>();
+            value = Json::parse(inAnswer.body).at(Json::json_pointer(where)).at(what).get<std::string>();
         else if (kind == "header")
             value = inAnswer.Header(what);
         else if (kind == "cookie")
