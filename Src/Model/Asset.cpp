@@ -12,6 +12,14 @@ namespace ZOCL {
 
 using ostcore::utility::ToUTF16;
 
+int Asset::QueryInterfaceNoAddRef(const RFL::InterfaceID& inID, void** outInterface) noexcept {
+    if (inID == kInterfaceID) {
+        *outInterface = this;
+        return kResultSuccess;
+    }
+    return Implements::QueryInterfaceNoAddRef(inID, outInterface);
+}
+
 bool Asset::GetAssetType(ImmutableString& outType) {
     const dto::AssetProperties properties = GetProperties("ZOCL::Asset::GetAssetType");
     outType = properties.AssetType();

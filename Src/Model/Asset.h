@@ -13,6 +13,11 @@ namespace ZOCL {
 class Asset final
     : public Implements<JSONServerResource<dto::Asset>, Readable<IZOCAsset>, Writable<IZOCWritableAsset>> {
 public:
+    /// Answers with the object itself, for code of this floor.
+    static constexpr RFL::InterfaceID kInterfaceID{0x7a6f634173736574ull, 0x0000000000000003ull};
+
+    int QueryInterfaceNoAddRef(const RFL::InterfaceID& inID, void** outInterface) noexcept override;
+
     bool GetAssetType(ImmutableString& outType) override;
     UString GetAssetTypeDisplayName() override;
     ImmutableString GetMediaLocatorIdentifier() override;
@@ -42,6 +47,9 @@ public:
     bool UpdatePropertiesOnServer(const Guid& inRequestID, const RequestCompletion& inCompletion) override;
     ImmutableString GetEnclosureFactoryURL() override;
     ImmutableString GetRenditionFactoryURL() override;
+
+    /// All properties as they are held, with those that this client does not know.
+    dto::AssetProperties GetStoredProperties() const { return GetProperties("Asset::GetStoredProperties"); }
 
 protected:
     std::string GetTraceName() override;

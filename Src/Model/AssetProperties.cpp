@@ -132,11 +132,12 @@ bool ReadSubClip(const dto::AssetProperties& inProperties, SubClip& outSubClip) 
         return false;
     }
     const auto stored = inProperties.Structure<dto::SubClip>("subClip");
+    // Assets that were made in bulk carry the key in any case; without boundaries it says that there is none.
     const std::int64_t invalid = ostmediatypes::kTime_Invalid.Ticks();
     outSubClip.startBoundary = ostmediatypes::TickTime(stored.Ticks("mStartBoundary", invalid));
     outSubClip.endBoundary = ostmediatypes::TickTime(stored.Ticks("mEndBoundary", invalid));
     outSubClip.boundaryIsHard = stored.Boolean("mBoundaryIsHard", true);
-    return true;
+    return outSubClip.startBoundary.IsValid() || outSubClip.endBoundary.IsValid();
 }
 
 void WriteSubClip(dto::AssetProperties& ioProperties, const SubClip& inSubClip) {

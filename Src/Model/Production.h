@@ -13,6 +13,7 @@
 namespace ZOCL {
 
 class AssetList;
+class BulkTransaction;
 class Enclosures;
 class TransactionList;
 
@@ -165,6 +166,8 @@ private:
     InterfaceRef<TransactionList> mTransactions ZO_GUARDED_BY(IZOCDataServer::GetLock());
     InterfaceRef<Production> mParent ZO_GUARDED_BY(IZOCDataServer::GetLock());
     InterfaceRef<TransactionList> mListOfParent ZO_GUARDED_BY(IZOCDataServer::GetLock());
+    /// The last one, as long as it lives.
+    weak_ptr<BulkTransaction> mBulkTransaction ZO_GUARDED_BY(IZOCDataServer::GetLock());
 };
 
 /// The body of a creation.

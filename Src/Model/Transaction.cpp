@@ -13,7 +13,6 @@
 #include "ostcore/utility/StringConversion.h"
 #include "Relations.h"
 #include "RequestChain/RepeatMark.h"
-#include "ZOClient/IZOCBulkTransaction.h"
 
 namespace ZOCL {
 
@@ -298,11 +297,6 @@ bool Production::StoreProductionChangesInTransaction(const InterfaceRef<IZOCTran
     }
     PutBackPropertyChanges(changes);
     return false;
-}
-
-InterfaceRef<IZOCBulkTransaction> Production::CreateBulkTransaction(
-    const shared_ptr<CompoundAsyncOperation>& /*inParentOperation*/) {
-    return nullptr;
 }
 
 }  // namespace ZOCL
