@@ -12,10 +12,17 @@ namespace zohub {
 namespace {
 
 constexpr char kPullTitle[] = "Got the latest changes";
+/// The key of a transaction's metadata under which it says "true".
+constexpr char kAnswersConflicts[] = "answersConflicts";
 
 [[noreturn]] void FailMoved() {
     throw Failure(412, "session-changed",
                   "The session has changed since the commit that the request names; load it and look again.");
+}
+
+bool AnswersConflicts(LineRecord const& inTransaction) {
+    Json const metadata = Json::parse(inTransaction.metadata, nullptr, false);
+    return metadata.is_object() && StringUnder(metadata, kAnswersConflicts) == "true";
 }
 
 MergeStrategy MergeStrategyOf(PullStrategy inStrategy) {
@@ -105,6 +112,13 @@ TreeRoot Sessions::Rebase(View const& inTransaction, CommitRecord const& inBase,
     return std::move(result.tree);
 }
 
+// What differs between the states before and after is what was changed.
+void Sessions::AnswerConflicts(View const& inSession, TreeRoot const& inBefore) {
+    auto const conflicts = mTransaction.ListConflicts(inSession.line.id);
+    for (auto const& changed : OpenConflicts(mTransaction, inBefore, inSession.tree, conflicts))
+        mTransaction.RemoveConflict(inSession.line.id, changed.kind, changed.item, changed.name);
+}
+
 void Sessions::CloseSettledConflicts(View const& inSession) {
     auto const conflicts = mTransaction.ListConflicts(inSession.line.id);
     if (conflicts.empty())
@@ -124,7 +138,10 @@ View Sessions::CommitTransaction(View& ioTransaction, ResolveStrategy inStrategy
             FailMoved();
         TreeRoot const tree = hasMoved ? Rebase(ioTransaction, base, session) : ioTransaction.tree;
         if (WriteTreeRoot(tree) != WriteTreeRoot(session.tree)) {
+            TreeRoot const before = session.tree;
             mRepository.CommitTree(session, tree, inTitle, mActor, mNow);
+            if (AnswersConflicts(ioTransaction.line))
+                AnswerConflicts(session, before);
             CloseSettledConflicts(session);
         }
     }

@@ -33,7 +33,8 @@ public:
     View OpenTransaction(View const& inSession, Opening const& inOpening);
 
     /// Makes what the transaction changed one commit of the session, ends the transaction, and gives the
-    /// session. Throws Failure 412 when the session has moved and the strategy does not help.
+    /// session. A transaction whose metadata says so answers the conflicts of the items that it changed.
+    /// Throws Failure 412 when the session has moved and the strategy does not help.
     View CommitTransaction(View& ioTransaction, ResolveStrategy inStrategy, std::string const& inTitle);
 
     struct Sharing {
@@ -58,6 +59,7 @@ private:
     bool IsOnSession(View const& inSession, CommitRecord const& inCommit);
     CommitRecord SharedCommit(View const& inProduction, std::string const& inCommit);
     TreeRoot Rebase(View const& inTransaction, CommitRecord const& inBase, View const& inSession);
+    void AnswerConflicts(View const& inSession, TreeRoot const& inBefore);
     void CloseSettledConflicts(View const& inSession);
     void Merge(View& ioSession, CommitRecord const& inBase, CommitRecord const& inTheirs,
                PullStrategy inStrategy, std::vector<ConflictRecord> const& inOpen);

@@ -298,6 +298,65 @@ TEST_F(ConflictTest, AConflictStaysOverFurtherPullsAndEndsWhenTheSidesMeet) {
     EXPECT_EQ(Problems(), std::vector<std::string>());
 }
 
+TEST_F(ConflictTest, ATransactionThatSaysSoAnswersTheConflictsOfWhatItChanged) {
+    BenShares([&](Json const& t) {
+        Rename(mBen, t, "a", "his");
+        Rename(mBen, t, "b", "his");
+        Encloses(mBen, "his")(t);
+        Describes(mBen, "his")(t);
+    });
+    Change(mAnna, mMine, [&](Json const& t) {
+        Rename(mAnna, t, "a", "mine");
+        Rename(mAnna, t, "b", "mine");
+        Encloses(mAnna, "mine")(t);
+        Describes(mAnna, "mine")(t);
+    });
+    ASSERT_EQ(Pull(mAnna, mMine).status, 200);
+    auto const open = [&] {
+        std::string list;
+        Json const outgoing = Outgoing();
+        for (char const* kind : {"assets", "enclosures"})
+            for (auto const& entry : outgoing[kind])
+                if (entry.contains("zo:conflictsWithContentId"))
+                    list += std::string(1, kind[0]) + entry["zo:assetId"].get<std::string>() + " ";
+        bool const isProduction =
+            outgoing.contains("properties") && outgoing["properties"].contains("zo:conflictsWithContentId");
+        return list + (isProduction ? "p" : "");
+    };
+    EXPECT_EQ(open(), "aa ab ea p");
+    // Going on with the work answers nothing.
+    Change(mAnna, mMine, [&](Json const& t) {
+        Encloses(mAnna, "more of mine")(t);
+        Rename(mAnna, t, "b", "more of mine");
+    });
+    EXPECT_EQ(open(), "aa ab ea p");
+
+    auto const answering = [&](char const* inValue, Edit const& inEdit) {
+        Json const body = {{"metadata", {{"answersConflicts", inValue}}}};
+        Json const t = Json::parse(mAnna.PostJson(LinkOf(mMine, "/transactions"), JsonText(body)).body);
+        inEdit(t);
+        Commit(mAnna, t);
+    };
+    answering("false", Encloses(mAnna, "again"));
+    EXPECT_EQ(open(), "aa ab ea p");
+    // Only what was changed is answered: writing what is there already does not count.
+    answering("true", [&](Json const& t) {
+        Encloses(mAnna, "both")(t);
+        Rename(mAnna, t, "a", "mine");
+    });
+    EXPECT_EQ(open(), "aa ab p");
+    answering("true", [&](Json const& t) {
+        Rename(mAnna, t, "a", "both");
+        Rename(mAnna, t, "b", "both");
+        Describes(mAnna, "both")(t);
+    });
+    EXPECT_EQ(open(), "");
+    ASSERT_EQ(Push(mAnna, mMine, "merged").status, 200);
+    EXPECT_EQ(Names(mBen, mProduction), (NameMap{{"a", "both"}, {"b", "both"}}));
+    EXPECT_EQ(EnclosureText(mBen, mProduction), "both");
+    EXPECT_EQ(Problems(), std::vector<std::string>());
+}
+
 TEST_F(ConflictTest, StrategiesDecideWhatBothSidesChangedAndNothingElse) {
     BenShares([&](Json const& t) {
         Rename(mBen, t, "a", "his");
