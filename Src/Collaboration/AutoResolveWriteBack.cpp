@@ -18,6 +18,9 @@ namespace {
 const char kCommitMessage[] =
     "$$$/ZOCL/ZOAutoResolveOperation/commitMessage=Automatically resolved XMP conflicts.";
 constexpr const char* kKey_CommitID = ":commitId";
+/// What the transaction says of itself, so that its commit ends the conflicts of what it wrote.
+constexpr const char* kMetadata_AnswersConflicts = "answersConflicts";
+constexpr const char* kMetadata_Yes = "true";
 
 InterfaceRef<IZOCWritableEnclosure> FindWritable(const InterfaceRef<IZOCProduction>& inProduction,
                                                  const AutoMergeItem& inItem) {
@@ -85,7 +88,8 @@ void ZOAutoResolveOperation::StartWriting() {
     const Operation operation = MakeOperation([self](int inResult) { self->OnWritesEnded(inResult); });
     operation->Initiate(
         [self](const Guid& inID, const RequestCompletion& inCompletion) {
-            return self->mSession->CreateTransaction(inID, inCompletion, kTransactionType_Edit);
+            const ExtraTransactionMetadata extra{{kMetadata_AnswersConflicts, kMetadata_Yes}};
+            return self->mSession->CreateTransaction(inID, inCompletion, kTransactionType_Edit, extra);
         },
         [self, operation](int inResult, const InterfaceRef<IZOCServerResource>& inTransaction,
                           const shared_ptr<ostnet::Response>&) {
@@ -220,6 +224,7 @@ void ZOAutoResolveOperation::ReloadDifferences(bool inMayAcceptOwn) {
     }
 }
 
+/// A merge can come out as what the session has already, which is no change that answers by itself.
 bool ZOAutoResolveOperation::AcceptOwnSides() {
     std::vector<ImmutableString> links;
     for (const IZOCDifferences::Entry& entry : mOutgoingChanges->GetEnclosureDifferences()) {
