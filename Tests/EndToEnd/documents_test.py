@@ -92,7 +92,7 @@ class Documents(EndToEndTest):
                 self.assertIn("`--" + option["name"], reference)
         for kind in ("hub", "login", "logout", "user", "production", "open", "asset", "file", "command", "version",
                      "completion", "man", "error", "progress", "session", "status", "added", "set", "put", "removed", "xmp",
-                     "transaction", "pending", "share", "latest", "conflict", "difference", "change"):
+                     "transaction", "pending", "share", "latest", "conflict", "difference", "change", "xmpMerge", "xmpDifference"):
             self.assertIn(f"`{kind}`", reference)
 
 

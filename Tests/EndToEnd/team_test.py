@@ -13,6 +13,13 @@ PACKET = (b'<x:xmpmeta xmlns:x="adobe:ns:meta/"><rdf:RDF xmlns:rdf="http://www.w
           b'<rdf:Description rdf:about=""/></rdf:RDF></x:xmpmeta>\n')
 
 
+def packet_of(source):
+    """The packet with one property, so that those of two users contradict one another."""
+    return PACKET.replace(b'<rdf:Description rdf:about=""/>',
+                          b'<rdf:Description rdf:about="" xmlns:dc="http://purl.org/dc/elements/1.1/"><dc:source>' +
+                          source + b'</dc:source></rdf:Description>')
+
+
 def of_type(result, kind):
     return [one for one in result.objects if one["type"] == kind]
 
@@ -187,8 +194,8 @@ class Walk(Team):
 class Conflicts(Team):
     def setUp(self):
         super().setUp()
-        packet = self.file(self.ada, "ada.xmp", PACKET)
-        self.file(self.ben, "ben.xmp", PACKET + b"<!-- ben -->\n")
+        packet = self.file(self.ada, "ada.xmp", packet_of(b"ada"))
+        self.file(self.ben, "ben.xmp", packet_of(b"ben"))
         self.ok(self.ada, "set", "--asset", "gulls.jpg", "name=Ada's gulls")
         self.ok(self.ada, "xmp", "set", "lighthouse.jpg", packet)
         self.ok(self.ada, "set", "--asset", "slate.png", "name=Both the same")
@@ -253,7 +260,7 @@ class Conflicts(Team):
         self.assertEqual(self.ends(self.ada.zo("get", copy, "--rendition", "image/jpeg", "-o", "-"), OK).out,
                          (self.media / "broll" / "gulls.jpg").read_bytes())
         self.assertNotIn("room-tone.wav", assets)
-        self.assertEqual(self.ends(self.ada.zo("xmp", "get", "lighthouse.jpg"), OK).out, PACKET + b"<!-- ben -->\n")
+        self.assertEqual(self.ends(self.ada.zo("xmp", "get", "lighthouse.jpg"), OK).out, packet_of(b"ben"))
         self.assertEqual(assets["anna-take1.mp4"]["description"], "Only Ben")
         self.assertEqual(assets["harbour-wide.mp4"]["description"], "Only Ada")
 

@@ -136,21 +136,32 @@ Command Remove() {
 Command Xmp() {
     return {
         "xmp",
-        "read or replace the XMP packet of an asset",
-        "'get' writes the packet to standard output or a file, byte for byte; 'set' makes the content of "
-        "a file the asset's packet.",
-        {{"ACTION", "What to do.", true, Completes::Choices, {"get", "set"}},
-         {"ASSET", "The asset, by name or identifier.", true},
-         {"FILE", "With set: the file that holds the packet.", false, Completes::Files}},
-        {{"output", 'o', "FILE", "With get: write to FILE.", Completes::Files},
+        "read, replace, merge and compare XMP packets",
+        "'get ASSET' writes the packet of an asset to standard output or a file, byte for byte; 'set ASSET "
+        "FILE' makes the content of a file the asset's packet. 'merge BASE THEIRS MINE' and 'diff OLD NEW' "
+        "work on files (- is standard input) and need no hub. 'merge' writes the merged packet to standard "
+        "output or a file and lists on standard error what could not be merged (code 3); there the packet "
+        "holds what MINE has. 'diff' lists what the packets say differently, and nothing when they say the "
+        "same.",
+        {{"ACTION", "What to do.", true, Completes::Choices, {"get", "set", "merge", "diff"}},
+         {"ASSET|FILE",
+          "The asset, by name or identifier, and with set the file; with merge and diff files.",
+          true,
+          Completes::Files,
+          {},
+          true}},
+        {{"output", 'o', "FILE", "With get and merge: write to FILE.", Completes::Files},
          kShared,
          kForce,
          kMessage,
          kKeepOpen,
          kDryRun},
         true,
-        {{"zo xmp get clip01 > clip01.xmp", "Read it."}, {"zo xmp set clip01 clip01.xmp", "Write it back."}},
-        AndAlso({ExitCode::SessionChanged}),
+        {{"zo xmp get clip01 > clip01.xmp", "Read it."},
+         {"zo xmp set clip01 clip01.xmp", "Write it back."},
+         {"zo xmp merge base.xmp theirs.xmp mine.xmp -o merged.xmp", "Merge three files."},
+         {"zo xmp diff base.xmp merged.xmp", "What has changed."}},
+        AndAlso({ExitCode::ConflictsRemain, ExitCode::SessionChanged}),
         RunXmp};
 }
 
@@ -206,24 +217,25 @@ Command Share() {
 }
 
 Command Latest() {
-    return {"latest",
-            "get the latest shared commits into your session",
-            "Takes what only others have changed, keeps what only you have changed, and leaves as conflicts "
-            "what both have changed in different ways (code 3). --dry-run lists what would conflict, with "
-            "who changed it, when and what on each side, and changes nothing.",
-            {},
-            {{"strategy",
-              0,
-              "HOW",
-              "What both sides have changed: leave it as conflicts (interactive), take a side, or change "
-              "nothing at all when there is any (safe).",
-              Completes::Choices,
-              {"interactive", "mine", "theirs", "safe"}},
-             kDryRun},
-            true,
-            {{"zo latest --dry-run", "What would come, and what would conflict."}, {"zo latest", "Get it."}},
-            AndAlso({ExitCode::ConflictsRemain, ExitCode::SessionChanged}),
-            RunLatest};
+    return {
+        "latest",
+        "get the latest shared commits into your session",
+        "Takes what only others have changed, keeps what only you have changed, merges XMP metadata that "
+        "both have changed, and leaves as conflicts what both have changed otherwise (code 3). --dry-run "
+        "lists what would conflict, with who changed it, when and what on each side, and changes nothing.",
+        {},
+        {{"strategy",
+          0,
+          "HOW",
+          "What both sides have changed: leave it as conflicts (interactive), take a side, or change "
+          "nothing at all when there is any (safe).",
+          Completes::Choices,
+          {"interactive", "mine", "theirs", "safe"}},
+         kDryRun},
+        true,
+        {{"zo latest --dry-run", "What would come, and what would conflict."}, {"zo latest", "Get it."}},
+        AndAlso({ExitCode::ConflictsRemain, ExitCode::SessionChanged}),
+        RunLatest};
 }
 
 Command Conflicts() {

@@ -1,4 +1,6 @@
 // share, latest: the session becomes a commit that all see, and gets what others have shared.
+#include <algorithm>
+
 #include "Conflicts.h"
 #include "Failure.h"
 #include "ostcore/utility/StringConversion.h"
@@ -6,6 +8,7 @@
 #include "Verbs.h"
 #include "WriteLock.h"
 #include "Writing.h"
+#include "ZOClient/XMPMerge.h"
 
 namespace zo {
 namespace {
@@ -173,6 +176,22 @@ Outcome Pull(Context& ioContext, const WorkSession& inSession, const std::string
         [server](const ZOCL::Guid& inRequest) { server->TryToCancelRequest(inRequest); });
 }
 
+// Merges the metadata that both sides changed; gives what is still in conflict.
+std::vector<Conflict> MergeMetadata(Context& ioContext, WorkSession& ioSession,
+                                    const std::vector<Conflict>& inConflicts, const std::string& inBase) {
+    const bool hasEnclosure = std::any_of(inConflicts.begin(), inConflicts.end(), [](const Conflict& inOne) {
+        return inOne.key.kind == ItemKind::Enclosure;
+    });
+    if (!hasEnclosure) {
+        return inConflicts;
+    }
+    const auto resource = RFL::QueryInterface<ZOCL::IZOCServerResource>(ioSession.session);
+    ZOCL::AutoResolveXMPConflicts(resource->GetHTTPURL(), ZOCL::ImmutableString(ioSession.view.commit));
+    RefreshSession(ioContext, ioSession);
+    RememberMoved(ioContext, ioSession, ioSession.view.commit, inBase);
+    return LoadOpenConflicts(ioContext, ioSession);
+}
+
 void GetLatest(Context& ioContext, WorkSession& ioSession, const LatestState& inState) {
     const std::string strategy = ioContext.Args().ValueOr("strategy", "interactive");
     const std::string what = "getting the latest of " + ioSession.productionName;
@@ -190,15 +209,20 @@ void GetLatest(Context& ioContext, WorkSession& ioSession, const LatestState& in
     const std::string base = TextInAnswer(outcome.response, "zo:baseCommitId");
     RememberMoved(ioContext, ioSession, TextInAnswer(outcome.response, "zo:commitId"), base);
     RefreshSession(ioContext, ioSession);
-    const std::vector<Conflict> conflicts = LoadOpenConflicts(ioContext, ioSession);
+    const std::vector<Conflict> opened = LoadOpenConflicts(ioContext, ioSession);
+    const std::vector<Conflict> conflicts = MergeMetadata(ioContext, ioSession, opened, base);
+    const std::size_t merged = opened.size() - std::min(opened.size(), conflicts.size());
     Json json = LatestJson(ioSession, inState);
     json.Set("commit", ioSession.view.commit).Set("baseCommit", base);
-    json.Set("conflicts", conflicts.size()).Set("moved", base != inState.base);
+    json.Set("conflicts", conflicts.size()).Set("moved", base != inState.base).Set("merged", merged);
     Output& out = ioContext.Out();
     out.Record(json.Set("dryRun", false));
     out.Say(base == inState.base ? "there is nothing newer than what the session is based on"
                                  : "got " + Plural(inState.incoming.size(), "change") +
                                        " of others; based on " + base + " now");
+    if (merged != 0) {
+        out.Say("merged the metadata of " + Plural(merged, "item") + " that both sides had changed");
+    }
     TellConflicts(ioContext, conflicts, "open");
     if (!conflicts.empty()) {
         throw Failure(ExitCode::ConflictsRemain, Plural(conflicts.size(), "item") + " in conflict",

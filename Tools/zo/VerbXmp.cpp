@@ -1,8 +1,9 @@
-// xmp: the XMP packet of an asset, read and replaced as a whole.
+// xmp: the XMP packet of an asset, read and replaced as a whole, and packets in files, merged and compared.
 #include "Failure.h"
 #include "FileWriter.h"
 #include "Payloads.h"
 #include "Verbs.h"
+#include "XmpFiles.h"
 
 namespace zo {
 namespace {
@@ -78,6 +79,10 @@ void SetPacket(Context& ioContext) {
     if (!path) {
         throw Failure(ExitCode::Usage, "'zo xmp set' needs the FILE that holds the packet");
     }
+    if (const auto more = args.Positional(3)) {
+        throw Failure(ExitCode::Usage, "'" + *more + "' is one argument too many for 'zo xmp set'",
+                      "'zo help xmp' shows what it takes");
+    }
     const Payload packet = ReadPayload(*path);
     CheckIsPacket(packet, *path);
     const auto write = [&](const LoadedProduction& inView, bool inWrite) {
@@ -104,7 +109,12 @@ void SetPacket(Context& ioContext) {
 }  // namespace
 
 void RunXmp(Context& ioContext) {
-    if (*ioContext.Args().Positional(0) == "set") {
+    const std::string action = *ioContext.Args().Positional(0);
+    if (action == "merge") {
+        MergePacketFiles(ioContext);
+    } else if (action == "diff") {
+        ComparePacketFiles(ioContext);
+    } else if (action == "set") {
         SetPacket(ioContext);
     } else {
         GetPacket(ioContext);
