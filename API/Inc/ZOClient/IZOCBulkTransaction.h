@@ -37,7 +37,8 @@ struct BulkNewAsset {
 /// all edits. A phase is sent when its finish operation was called and what it waits for has ended; every
 /// request of a phase ends before the next phase begins. The whole counts as one request of the parent
 /// operation that was given to CreateBulkTransaction: its final function tells that everything has ended, and
-/// the first failure. An object is used once; it can be made anew when IsCompletelyFinished.
+/// the first failure. An object is used once; another can be made when it IsCompletelyFinished. That one goes
+/// by the lists that the transaction holds, so Refresh the transaction in between.
 ///
 /// Failures: the first one ends the work. Requests under way are asked to cancel, and phases that have not
 /// begun send nothing. What stood in a request is told to its completions with the result of that request;
