@@ -5,6 +5,7 @@
 
 #include "dto/Production.h"
 #include "JSONServerResource.h"
+#include "Model/XMPCache.h"
 #include "Resources/Implements.h"
 #include "ZOClient/IZOCEditingSession.h"
 #include "ZOClient/IZOCProduction.h"
@@ -48,6 +49,8 @@ public:
     InterfaceRef<IZOCProductionHistory> GetProductionHistory() override;
     ImmutableString GetMostRecentRevision() override;
     ImmutableString GetLoadedRevision() override;
+    std::string ReadXMP(const ImmutableString& inKey) override;
+    std::string ReadXMP(const InterfaceRef<IZOCAsset>& inItem) override;
     InterfaceRef<IZOCEnclosures> GetEnclosures() override;
     bool Copy(const Guid& inRequestID, const RequestCompletion& inCompletion, const UString& inName,
               const UString& inDescription, bool inIsTemporary) override;
@@ -61,7 +64,8 @@ public:
     bool IsTransaction() override;
     bool IsTemplate() override;
 
-    // --- IZOCEditingSession (EditingSession.cpp, TransactionCreation.cpp, PendingTransactions.cpp).
+    // --- IZOCEditingSession (EditingSession.cpp, TransactionCreation.cpp, PendingTransactions.cpp,
+    // XMPCache.cpp, UnstoredChanges.cpp).
 
     bool CreateTransaction(const Guid& inRequestID, const RequestCompletion& inCompletion,
                            const ImmutableString& inTransactionType,
@@ -85,6 +89,10 @@ public:
     using ServerResource::Refresh;
     InterfaceRef<IZOCDifferences> GetOutgoingChanges() override;
     InterfaceRef<IZOCDifferences> GetIncomingChanges() override;
+    void CacheXMP(const ImmutableString& inKey, const std::string& inPacket, bool inDirty) override;
+    bool HasCachedXMPChanges() override;
+    void StoreCachedXMPChangesInBulkTransaction(const InterfaceRef<IZOCBulkTransaction>& inBulk) override;
+    void ClearXMPCache() override;
     bool StoreProductionChangesInTransaction(const InterfaceRef<IZOCTransaction>& inTransaction,
                                              const ResultCompletion& inCompletion) override;
 
@@ -154,14 +162,20 @@ private:
                                  const RequestCompletion& inCompletion);
     void ClearCachedState();
     void LeaveListOfParent();
-    PropertyChanges TakePropertyChanges();
-    /// Those that were set anew meanwhile stay as they are.
-    void PutBackPropertyChanges(const PropertyChanges& inChanges);
+    struct UnstoredChanges;
+    UnstoredChanges TakeUnstoredChanges();
+    /// What was set anew meanwhile stays as it is.
+    void PutBackUnstoredChanges(const UnstoredChanges& inChanges);
+    /// Starts on the transaction what this object's changes ask for.
+    bool PutPropertiesInTransaction(const InterfaceRef<Production>& inTransaction, const Guid& inRequestID,
+                                    const RequestCompletion& inCompletion);
     void ApplyPropertyChanges();
+    shared_ptr<RecycledMemory const> FindChangedXMP(const ImmutableString& inKey);
 
     InterfaceRef<AssetList> mAssets ZO_GUARDED_BY(IZOCDataServer::GetLock());
     InterfaceRef<Enclosures> mEnclosures ZO_GUARDED_BY(IZOCDataServer::GetLock());
     PropertyChanges mPropertyChanges ZO_GUARDED_BY(IZOCDataServer::GetLock());
+    XMPCache mXMPCache ZO_GUARDED_BY(IZOCDataServer::GetLock());
     InterfaceRef<TransactionList> mTransactionFactory ZO_GUARDED_BY(IZOCDataServer::GetLock());
     InterfaceRef<TransactionList> mTransactions ZO_GUARDED_BY(IZOCDataServer::GetLock());
     InterfaceRef<Production> mParent ZO_GUARDED_BY(IZOCDataServer::GetLock());

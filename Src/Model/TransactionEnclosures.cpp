@@ -1,26 +1,14 @@
 // Writes an enclosure of a transaction: over the one of its name, or as a new one.
-#include "Model/Enclosure.h"
+#include "Model/EnclosureWrite.h"
 #include "Model/Production.h"
-#include "Model/ServerResourceWithEnclosures.h"
 #include "Model/TransactionList.h"
 
 namespace ZOCL {
 
 using ostcore::threads::ScopedLock;
 
-namespace {
-
-struct EnclosureWrite {
-    InterfaceRef<Enclosures> list;
-    InterfaceRef<IZOCDataServer> server;
-    ImmutableString name;
-    shared_ptr<RecycledMemory const> payload;
-    ImmutableString contentType;
-};
-
-/// The list is loaded.
-bool StartWrite(const EnclosureWrite& inWrite, const Guid& inRequestID,
-                const RequestCompletion& inCompletion) {
+bool StartEnclosureWrite(const EnclosureWrite& inWrite, const Guid& inRequestID,
+                         const RequestCompletion& inCompletion) {
     const auto present = RFL::QueryInterface<Enclosure>(inWrite.list->GetEnclosure(inWrite.name));
     if (present) {
         return present->PutPayloadOfType(inWrite.payload, inWrite.contentType, inRequestID, inCompletion);
@@ -40,8 +28,6 @@ bool StartWrite(const EnclosureWrite& inWrite, const Guid& inRequestID,
                                  inWrite.name, inWrite.payload, inWrite.contentType, onCreated);
 }
 
-}  // namespace
-
 bool Production::WriteEnclosure(const ImmutableString& inPath, const std::string& inText,
                                 const Guid& inRequestID, const RequestCompletion& inCompletion,
                                 const ImmutableString& inContentType) {
@@ -59,13 +45,13 @@ bool Production::WriteEnclosure(const ImmutableString& inPath, const std::string
     write.contentType =
         inContentType.empty() ? ostnet::kHEADER_CONTENT_TYPE_APPLICATION_JSON_UTF_8 : inContentType;
     if (write.list->IsLoaded()) {
-        return StartWrite(write, inRequestID, inCompletion);
+        return StartEnclosureWrite(write, inRequestID, inCompletion);
     }
     const auto onLoaded = [write, inCompletion](const Guid& inID, int inResult,
                                                 const InterfaceRef<IZOCServerResource>&,
                                                 const shared_ptr<ostnet::Response>& inResponse) {
         const int result = inResult >= 0 && !write.list->IsLoaded() ? kResultFailure : inResult;
-        if (result >= 0 && StartWrite(write, inID, inCompletion)) {
+        if (result >= 0 && StartEnclosureWrite(write, inID, inCompletion)) {
             return;
         }
         if (inCompletion) {

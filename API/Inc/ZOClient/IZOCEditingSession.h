@@ -87,9 +87,22 @@ public:
     /// New, unloaded; null without the link.
     virtual InterfaceRef<IZOCDifferences> GetOutgoingChanges() = 0;
     virtual InterfaceRef<IZOCDifferences> GetIncomingChanges() = 0;
-    /// Writes the name and description that were set on this object into the transaction, when they were.
-    /// Completes with 0 when there was nothing to write; after a failure the changes are kept for another
-    /// try.
+    /// Keeps the XMP packet of an item, in UTF-8, until it is stored with the session's other changes. The
+    /// key is the identifier of the item's media locator. A dirty packet is a change of this client, another
+    /// one a copy of what the server holds; a copy never takes the place of a change, else the newer packet
+    /// counts. Nothing happens on an object that is no session, and for an empty key.
+    virtual void CacheXMP(const ImmutableString& inKey, const std::string& inPacket, bool inDirty) = 0;
+    /// True when there is something to store: cached packets, or a name or description that was set.
+    virtual bool HasCachedXMPChanges() = 0;
+    /// Hands all cached packets to the bulk transaction as enclosures of the production: changes over what
+    /// is there, copies only where nothing is. They stay cached: clear the cache when they have arrived.
+    virtual void StoreCachedXMPChangesInBulkTransaction(const InterfaceRef<IZOCBulkTransaction>& inBulk) = 0;
+    /// Forgets all cached packets. A name or description that was set stays to be stored.
+    virtual void ClearXMPCache() = 0;
+    /// Writes the cached packets, and the name and description that were set on this object, into the
+    /// transaction: changed packets over the XMP enclosures that are there, copies only where nothing is. The
+    /// cache is empty from here on. Completes with 0 when there was nothing to write; after a failure all is
+    /// kept for another try, but for packets that were cached anew meanwhile.
     virtual bool StoreProductionChangesInTransaction(const InterfaceRef<IZOCTransaction>& inTransaction,
                                                      const ResultCompletion& inCompletion) = 0;
     /// The same operation as that of IZOCTransaction: null on a session that is no transaction.

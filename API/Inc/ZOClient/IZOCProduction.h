@@ -58,6 +58,12 @@ public:
     virtual ImmutableString GetMostRecentRevision() = 0;
     /// The commit of the loaded body.
     virtual ImmutableString GetLoadedRevision() = 0;
+    /// Blocks. The XMP packet of an item, in UTF-8: of an editing session the one that CacheXMP was given as
+    /// a change, else that of the production's enclosure "<key>_xmp". The key is the identifier of the item's
+    /// media locator. Empty when there is none or it cannot be loaded; the reason is traced.
+    virtual std::string ReadXMP(const ImmutableString& inKey) = 0;
+    /// The same with the key of the item; empty for a null one and for one without a media locator.
+    virtual std::string ReadXMP(const InterfaceRef<IZOCAsset>& inItem) = 0;
     virtual InterfaceRef<IZOCEnclosures> GetEnclosures() = 0;
     /// Posts a copy; the completion's resource answers IZOCProduction.
     virtual bool Copy(const Guid& inRequestID, const RequestCompletion& inCompletion, const UString& inName,
