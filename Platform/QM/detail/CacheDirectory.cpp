@@ -16,6 +16,8 @@ namespace detail {
 namespace {
 
 constexpr int kShards = 256;
+/// Not blocking, so that a pipe in the place of a file does not hold us up before it is refused.
+constexpr int kReadFlags = O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC;
 constexpr std::int64_t kTouchAfterSeconds = 60;
 constexpr std::int64_t kSweepAfterSeconds = 3600;
 constexpr std::string_view kAsidePrefix = ".new-";
@@ -38,8 +40,14 @@ bool IsAsideName(std::string_view inName) {
     return inName.substr(0, kAsidePrefix.size()) == kAsidePrefix;
 }
 
+/// Whose the directory is, too.
+uid_t User() {
+    static const uid_t sUser = ::geteuid();
+    return sUser;
+}
+
 bool IsOwnRegularFile(const struct stat& inStatus) {
-    return S_ISREG(inStatus.st_mode) && inStatus.st_uid == ::geteuid();
+    return S_ISREG(inStatus.st_mode) && inStatus.st_uid == User();
 }
 
 /// Moves on by so many bytes; returns how many parts are left.
@@ -122,7 +130,7 @@ bool IsOurs(FileOperations& inOperations, int inDirectory, std::string& outError
         outError = SystemReason();
         return false;
     }
-    if (status.st_uid != ::geteuid()) {
+    if (status.st_uid != User()) {
         outError = "it belongs to another user";
         return false;
     }
@@ -218,15 +226,24 @@ CacheDirectory::Outcome CacheDirectory::ReadOpened(int inFile, const EntryKey& i
 
 CacheDirectory::Outcome CacheDirectory::Read(const EntryKey& inKey,
                                              shared_ptr<RecycledMemory>& outPayload) const {
+    const std::string path = DirectoryNameOf(inKey) + "/" + FileNameOf(inKey);
+    const OpenFile file(*mOperations, mOperations->OpenBeneath(mRoot, path.c_str(), kReadFlags));
+    if (file.IsOpen()) {
+        const Outcome outcome = ReadOpened(file.Get(), inKey, outPayload);
+        // Damaged: the longer way sees it again and knows where to remove it.
+        return outcome == Outcome::kDamaged ? ReadStepByStep(inKey, outPayload) : outcome;
+    }
+    return errno == ENOENT ? Outcome::kMissing : ReadStepByStep(inKey, outPayload);
+}
+
+CacheDirectory::Outcome CacheDirectory::ReadStepByStep(const EntryKey& inKey,
+                                                       shared_ptr<RecycledMemory>& outPayload) const {
     const std::string name = FileNameOf(inKey);
     const OpenFile shard = OpenShard(DirectoryNameOf(inKey), O_PATH);
     if (!shard.IsOpen()) {
         return errno == ENOENT ? Outcome::kMissing : Outcome::kFailed;
     }
-    // Not blocking, so that a pipe in the place of the file does not hold us up before it is refused.
-    const OpenFile file(*mOperations,
-                        mOperations->OpenAt(shard.Get(), name.c_str(),
-                                            O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC, 0));
+    const OpenFile file(*mOperations, mOperations->OpenAt(shard.Get(), name.c_str(), kReadFlags, 0));
     const bool isLink = !file.IsOpen() && errno == ELOOP;
     if (!file.IsOpen() && !isLink) {
         return errno == ENOENT ? Outcome::kMissing : Outcome::kFailed;

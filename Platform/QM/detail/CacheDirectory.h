@@ -69,6 +69,7 @@ public:
 private:
     OpenFile OpenShard(const std::string& inName, int inFlags) const;
     OpenFile MakeShard(const std::string& inName) const;
+    Outcome ReadStepByStep(const EntryKey& inKey, shared_ptr<RecycledMemory>& outPayload) const;
     Outcome ReadOpened(int inFile, const EntryKey& inKey, shared_ptr<RecycledMemory>& outPayload) const;
     bool WriteWhole(int inFile, const EntryKey& inKey, std::string_view inPayload) const;
     bool ReadWhole(int inFile, Header& outHeader, RecycledMemory& outPayload) const;

@@ -1,6 +1,10 @@
 #include "QM/detail/FileDataCache.h"
 
+#include <algorithm>
+#include <thread>
+
 #include "ostcore/debug/Trace.h"
+#include "ostcore/threads/detail/GuardedCall.h"
 
 namespace QM {
 namespace detail {
@@ -19,7 +23,14 @@ constexpr std::uint64_t kMaximumPendingBytes = 64ull << 20;
 /// few reads.
 constexpr std::size_t kLookupsBeforeLook = 32;
 constexpr std::size_t kMaximumKnownNames = 16;
+constexpr std::size_t kWritesInATurn = 256;
 constexpr std::chrono::minutes kLookPeriod{10};
+
+/// More would contend for the processor, fewer would let one slow read hold up all others.
+std::size_t MostReadTurns() {
+    static const std::size_t sMost = std::clamp<std::size_t>(std::thread::hardware_concurrency(), 2, 8);
+    return sMost;
+}
 
 /// How many writes of this process make another look worth while.
 std::size_t WritesBetweenLooks(std::size_t inMaximumCount) {
@@ -105,9 +116,56 @@ int FileDataCache::Read(const ImmutableString& inKey, const ImmutableString& inN
     if (!IsStored(key)) {
         return kResultFailure;
     }
+    std::uint64_t number = 0;
+    {
+        MutexLock lock(mMutex);
+        number = ++mLastRead;
+        mReads.push_back({number, key, inCompletion});
+        if (mReadTurns >= MostReadTurns()) {
+            return kResultContentPending;
+        }
+        ++mReadTurns;
+    }
+    return PostReads(number) ? kResultContentPending : kResultFailure;
+}
+
+/// False when the read of that number will not take place.
+bool FileDataCache::PostReads(std::uint64_t inNumber) {
     const auto self = shared_from_this();
-    const bool isPosted = mReaders->Post([self, key, inCompletion] { self->ReadFile(key, inCompletion); });
-    return isPosted ? kResultContentPending : kResultFailure;
+    if (mReaders->Post([self] { self->RunReads(); })) {
+        return true;
+    }
+    WaitingRead dropped;
+    MutexLock lock(mMutex);
+    --mReadTurns;
+    const auto found = std::find_if(mReads.begin(), mReads.end(), [inNumber](const WaitingRead& inRead) {
+        return inRead.number == inNumber;
+    });
+    if (found == mReads.end()) {
+        return true;
+    }
+    dropped = std::move(*found);
+    mReads.erase(found);
+    lock.Unlock();
+    return false;
+}
+
+/// False when none waits; then the turn has ended.
+bool FileDataCache::TakeRead(WaitingRead& outRead) {
+    MutexLock lock(mMutex);
+    if (mReads.empty()) {
+        --mReadTurns;
+        return false;
+    }
+    outRead = std::move(mReads.front());
+    mReads.pop_front();
+    return true;
+}
+
+void FileDataCache::RunReads() {
+    for (WaitingRead read; TakeRead(read); read.completion.clear()) {
+        ostcore::threads::CallGuarded([&] { ReadFile(read.key, read.completion); }, "a read of a cache");
+    }
 }
 
 void FileDataCache::ReadFile(const EntryKey& inKey, const ReadCompletion& inCompletion) {
@@ -169,14 +227,49 @@ bool FileDataCache::Write(const ImmutableString& inKey, const ImmutableString& i
         if (isOnItsWay) {
             return true;
         }
+        mKeysToWrite.push_back(key);
+        if (mHasWriteTurn) {
+            return true;
+        }
+        mHasWriteTurn = true;
     }
+    return PostWrites(key);
+}
+
+/// The executor refuses nothing but what comes after the end of use.
+bool FileDataCache::PostWrites(const EntryKey& inKey) {
     const auto self = shared_from_this();
-    if (mWriter->Post([self, key] { self->WritePending(key); })) {
+    if (mWriter->Post([self] { self->RunWrites(); })) {
         return true;
     }
     MutexLock lock(mMutex);
-    DropPending(key);
+    mKeysToWrite.clear();
+    DropPending(inKey);
     return false;
+}
+
+/// False when there is none; then the turn has ended.
+bool FileDataCache::TakeKeyToWrite(EntryKey& outKey) {
+    MutexLock lock(mMutex);
+    if (mKeysToWrite.empty()) {
+        mHasWriteTurn = false;
+        return false;
+    }
+    outKey = mKeysToWrite.front();
+    mKeysToWrite.pop_front();
+    return true;
+}
+
+/// Lets the other work of the writer through from time to time.
+void FileDataCache::RunWrites() {
+    EntryKey key;
+    for (std::size_t count = 0; count < kWritesInATurn; ++count) {
+        if (mIsClosed || !TakeKeyToWrite(key)) {
+            return;
+        }
+        ostcore::threads::CallGuarded([&] { WritePending(key); }, "a write of a cache");
+    }
+    PostWrites(key);
 }
 
 void FileDataCache::DropPending(const EntryKey& inKey) {
@@ -184,7 +277,9 @@ void FileDataCache::DropPending(const EntryKey& inKey) {
     if (found != mPending.end()) {
         mPendingBytes -= found->second->size();
         mPending.erase(found);
-        mWritten.NotifyAll();
+        if (mPending.empty()) {
+            mWritten.NotifyAll();
+        }
     }
 }
 

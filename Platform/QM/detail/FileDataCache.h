@@ -2,6 +2,7 @@
 #pragma once
 
 #include <chrono>
+#include <deque>
 #include <set>
 #include <unordered_map>
 
@@ -15,8 +16,10 @@ namespace QM {
 namespace detail {
 
 /// Writes, evictions and looks at the whole directory run one after the other on a sub-executor; reads run
-/// beside them on the executor above it. So the count needs no guard against other writers of this process:
-/// room for a file is made before it appears, by the only one that makes files appear.
+/// beside them, a few at a time, on the executor above it. A turn on a thread goes on for as long as there is
+/// work of its kind: to wake a thread for a payload of some KiB would cost more than the payload. So the
+/// count needs no guard against other writers of this process: room for a file is made before it appears, by
+/// the only one that makes files appear.
 ///
 /// The directory is looked at as a whole before the first write, and again after so many writes of this
 /// process, because other processes add and remove files too. The new picture takes the place of the old one
@@ -47,8 +50,19 @@ public:
 
 private:
     using Pending = std::unordered_map<EntryKey, Payload, EntryKeyHash>;
+    struct WaitingRead {
+        std::uint64_t number;
+        EntryKey key;
+        ReadCompletion completion;
+    };
 
     explicit FileDataCache(shared_ptr<CacheDirectory> inDirectory);
+    bool PostReads(std::uint64_t inNumber);
+    bool TakeRead(WaitingRead& outRead);
+    void RunReads();
+    bool PostWrites(const EntryKey& inKey);
+    bool TakeKeyToWrite(EntryKey& outKey);
+    void RunWrites();
     void WritePending(const EntryKey& inKey);
     void WriteWithinBounds(const EntryKey& inKey, const Payload& inPayload);
     void DropPending(const EntryKey& inKey) ZO_REQUIRES(mMutex);
@@ -83,6 +97,11 @@ private:
     std::size_t mMaximumCount ZO_GUARDED_BY(mMutex) = DiskCacheManager::kDefaultMaximumFileCount;
     std::uint64_t mMaximumBytes ZO_GUARDED_BY(mMutex) = DiskCacheManager::kDefaultMaximumByteCount;
     std::set<std::string> mKnownNames ZO_GUARDED_BY(mMutex);
+    std::deque<WaitingRead> mReads ZO_GUARDED_BY(mMutex);
+    std::uint64_t mLastRead ZO_GUARDED_BY(mMutex) = 0;
+    std::size_t mReadTurns ZO_GUARDED_BY(mMutex) = 0;
+    std::deque<EntryKey> mKeysToWrite ZO_GUARDED_BY(mMutex);
+    bool mHasWriteTurn ZO_GUARDED_BY(mMutex) = false;
     Pending mPending ZO_GUARDED_BY(mMutex);
     std::uint64_t mPendingBytes ZO_GUARDED_BY(mMutex) = 0;
 };

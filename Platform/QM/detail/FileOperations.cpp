@@ -1,6 +1,8 @@
 #include "QM/detail/FileOperations.h"
 
 #include <fcntl.h>
+#include <linux/openat2.h>
+#include <sys/syscall.h>
 #include <unistd.h>
 #include <cerrno>
 #include <cstdio>
@@ -12,6 +14,13 @@ FileOperations::~FileOperations() = default;
 
 int FileOperations::OpenAt(int inDirectory, const char* inPath, int inFlags, mode_t inMode) {
     return ::openat(inDirectory, inPath, inFlags, inMode);
+}
+
+int FileOperations::OpenBeneath(int inDirectory, const char* inPath, int inFlags) {
+    open_how how{};
+    how.flags = static_cast<__u64>(inFlags);
+    how.resolve = RESOLVE_BENEATH | RESOLVE_NO_SYMLINKS;
+    return static_cast<int>(::syscall(SYS_openat2, inDirectory, inPath, &how, sizeof how));
 }
 
 int FileOperations::Close(int inFile) {

@@ -18,6 +18,9 @@ class ZOPLATFORM_EXPORT FileOperations {
 public:
     virtual ~FileOperations();
     virtual int OpenAt(int inDirectory, const char* inPath, int inFlags, mode_t inMode);
+    /// Opens what lies below a directory, through no link and never outside; fails with ENOSYS where the
+    /// system has no such call.
+    virtual int OpenBeneath(int inDirectory, const char* inPath, int inFlags);
     virtual int Close(int inFile);
     virtual int FStat(int inFile, struct stat& outStatus);
     /// Does not follow a link.

@@ -159,7 +159,7 @@ bool CachingProcessor::OnStartFailed(const FetchRef& inFetch, const Guid& inCall
         others = Close(*inFetch);
         wasWaiting = others.erase(inCaller) > 0;
     }
-    HandOut(std::move(others), boost::make_shared<Response>(Response::kStatusNoResponse), nullptr);
+    HandOut(Answer(std::move(others), boost::make_shared<Response>(Response::kStatusNoResponse), nullptr));
     return !wasWaiting;
 }
 
@@ -196,7 +196,7 @@ void CachingProcessor::Completion(const FetchRef& inFetch, const ResponseRef& in
     if (isRepeated) {
         FetchAgain(inFetch, networkID, inResponse);
     } else {
-        HandOut(std::move(waiters), inResponse, confirmed);
+        HandOutHere(Answer(std::move(waiters), inResponse, confirmed));
     }
 }
 
@@ -210,7 +210,7 @@ void CachingProcessor::FetchAgain(const FetchRef& inFetch, const Guid& inNetwork
         ScopedLock lock(mMutex, "CachingProcessor::FetchAgain");
         waiters = Close(*inFetch);
     }
-    HandOut(std::move(waiters), inResponse, nullptr);
+    HandOutHere(Answer(std::move(waiters), inResponse, nullptr));
 }
 
 CachingProcessor::Waiters CachingProcessor::Close(Fetch& ioFetch) {
@@ -226,11 +226,12 @@ CachingProcessor::Waiters CachingProcessor::Close(Fetch& ioFetch) {
 }
 
 /// inConfirmed is the held answer that a 304 spoke of, null for any other response.
-void CachingProcessor::HandOut(Waiters inWaiters, const ResponseRef& inResponse,
-                               const ResponseRef& inConfirmed) {
+CachingProcessor::Deliveries CachingProcessor::Answer(Waiters inWaiters, const ResponseRef& inResponse,
+                                                      const ResponseRef& inConfirmed) {
     const ImmutableString tag =
         inConfirmed ? GetHeader(inConfirmed->headers, kHEADER_ETAG) : ImmutableString();
     ResponseRef notModified;
+    Deliveries deliveries;
     for (auto& [requestID, waiter] : inWaiters) {
         waiter.delivery->response = inConfirmed ? inConfirmed : inResponse;
         if (inConfirmed && waiter.ifNoneMatch == tag) {
@@ -239,10 +240,29 @@ void CachingProcessor::HandOut(Waiters inWaiters, const ResponseRef& inResponse,
             }
             waiter.delivery->response = notModified;
         }
-        if (!Deliver(waiter.delivery)) {
-            waiter.delivery->completion(requestID, waiter.delivery->response);
+        deliveries.push_back(std::move(waiter.delivery));
+    }
+    return deliveries;
+}
+
+/// On workers, each on its own turn.
+void CachingProcessor::HandOut(const Deliveries& inDeliveries) {
+    for (const shared_ptr<Delivery>& delivery : inDeliveries) {
+        if (!Deliver(delivery)) {
+            delivery->completion(delivery->requestID, delivery->response);
         }
     }
+}
+
+/// On a worker: one of them needs no other.
+void CachingProcessor::HandOutHere(Deliveries inDeliveries) {
+    if (inDeliveries.empty()) {
+        return;
+    }
+    const shared_ptr<Delivery> last = std::move(inDeliveries.back());
+    inDeliveries.pop_back();
+    HandOut(inDeliveries);
+    last->completion(last->requestID, last->response);
 }
 
 bool CachingProcessor::Deliver(const shared_ptr<Delivery>& inDelivery) {

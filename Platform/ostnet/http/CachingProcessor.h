@@ -84,6 +84,7 @@ private:
         ImmutableString ifNoneMatch;
     };
     using Waiters = std::map<Guid, Waiter>;
+    using Deliveries = std::vector<shared_ptr<Delivery>>;
     struct Fetch;
     using FetchRef = shared_ptr<Fetch>;
 
@@ -94,7 +95,10 @@ private:
     void Completion(const FetchRef& inFetch, const ResponseRef& inResponse);
     void FetchAgain(const FetchRef& inFetch, const Guid& inNetworkID, const ResponseRef& inResponse);
     Waiters Close(Fetch& ioFetch) ZO_REQUIRES(mMutex);
-    void HandOut(Waiters inWaiters, const ResponseRef& inResponse, const ResponseRef& inConfirmed);
+    static Deliveries Answer(Waiters inWaiters, const ResponseRef& inResponse,
+                             const ResponseRef& inConfirmed);
+    void HandOut(const Deliveries& inDeliveries);
+    void HandOutHere(Deliveries inDeliveries);
     bool Deliver(const shared_ptr<Delivery>& inDelivery);
     CompletionFunction EndOfWrite(const CompletionFunction& inCompletion);
 

@@ -26,6 +26,9 @@ public:
     int OpenAt(int inDirectory, const char* inPath, int inFlags, mode_t inMode) override {
         return Fails() ? -1 : FileOperations::OpenAt(inDirectory, inPath, inFlags, inMode);
     }
+    int OpenBeneath(int inDirectory, const char* inPath, int inFlags) override {
+        return Fails() ? -1 : FileOperations::OpenBeneath(inDirectory, inPath, inFlags);
+    }
     /// A descriptor is gone whatever close says.
     int Close(int inFile) override {
         const int result = FileOperations::Close(inFile);
