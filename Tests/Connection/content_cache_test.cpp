@@ -225,6 +225,13 @@ public:
         }
         return FileOperations::OpenAt(inDirectory, inPath, inFlags, inMode);
     }
+    int OpenBeneath(int inDirectory, const char* inPath, int inFlags) override {
+        if (mIsDead) {
+            errno = EIO;
+            return -1;
+        }
+        return FileOperations::OpenBeneath(inDirectory, inPath, inFlags);
+    }
     std::atomic<bool> mIsDead{false};
 };
 
