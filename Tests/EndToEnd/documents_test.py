@@ -18,7 +18,7 @@ class Documents(EndToEndTest):
     def test_every_verb_is_there_with_help_examples_and_exit_codes(self):
         self.assertEqual([verb["name"] for verb in self.table],
                          ["hub", "login", "logout", "whoami", "productions", "open", "show", "assets", "get", "session",
-                          "status", "add", "set", "put", "rm", "xmp", "commit", "rollback", "pending", "share", "latest",
+                          "status", "add", "ingest", "set", "put", "rm", "xmp", "commit", "rollback", "pending", "share", "latest",
                           "conflicts", "resolve", "diff", "history", "watch", "help", "version", "completion", "man"])
         overview = self.ends(self.ada.zo("help"), OK).text
         for verb in self.table:
@@ -91,7 +91,7 @@ class Documents(EndToEndTest):
             for option in verb["options"]:
                 self.assertIn("`--" + option["name"], reference)
         for kind in ("hub", "login", "logout", "user", "production", "open", "asset", "file", "command", "version",
-                     "completion", "man", "error", "progress", "session", "status", "added", "set", "put", "removed", "xmp",
+                     "completion", "man", "error", "progress", "session", "status", "added", "ingested", "ingest", "set", "put", "removed", "xmp",
                      "transaction", "pending", "share", "latest", "conflict", "difference", "change", "xmpMerge", "xmpDifference"):
             self.assertIn(f"`{kind}`", reference)
 

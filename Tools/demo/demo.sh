@@ -212,6 +212,14 @@ ada pending
 ada rollback
 ada status
 
+tell "A whole folder with its sidecars comes in at once, and again only as far as it is missing"
+cp -R "$work/media/broll" "$work/day3"
+ada ingest "$work/day3"
+cp "$work/media/slate.png" "$work/day3/slate.png"
+ada ingest "$work/day3"
+added="$(ada ingest "$work/day3" --json | tail -n 1 | value added)"
+[[ "$added" -eq 0 ]] || fail "a folder that is there was added again"
+
 tell "A look at the hub's books"
 stop_hub
 run "$zohub" check --data "$work/hub"

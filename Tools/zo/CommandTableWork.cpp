@@ -81,6 +81,34 @@ Command Add() {
             RunAdd};
 }
 
+Command Ingest() {
+    return {
+        "ingest",
+        "bring a folder of media with its sidecars into your session",
+        "Every media file below DIR becomes a master clip in a bin like its folder, with a media locator, "
+        "the "
+        "XMP packet of its sidecar (clip.mp4.xmp or clip.xmp) and, where it can be shown as it is, a "
+        "rendition. What the production has already stays as it is, so that the command can be run again: it "
+        "adds only what is missing. The files go in transactions of up to 10,000; what is committed stays "
+        "when "
+        "a later one fails or is interrupted. Files that fail do not stop the others (code 11). Symbolic "
+        "links "
+        "are not followed and hidden files are passed over.",
+        {{"DIR", "The folder.", true, Completes::Directories}},
+        {{"parent", 'p', "ASSET", "Put it all into this bin, by name or identifier."},
+         {"mount", 0, "LABEL",
+          "The label of the storage in the media's locations; the name of DIR when it is left out."},
+         {"update", 0, "", "Replace the packets of clips that are there, where the sidecar is another one."},
+         {"batch", 0, "N", "At most so many files in one transaction; 10000 when it is left out."},
+         kMessage,
+         kDryRun},
+        true,
+        {{"zo ingest day1/ --parent 'Day 1'", "A day's footage."},
+         {"zo ingest day1/ --parent 'Day 1' --update", "The sidecars were changed."}},
+        AndAlso({ExitCode::SessionChanged, ExitCode::PartlyDone}),
+        RunIngest};
+}
+
 Command Set() {
     return {
         "set",
@@ -317,8 +345,8 @@ Command Watch() {
 }  // namespace
 
 std::vector<Command> WorkCommands() {
-    return {Session(), Status(), Add(),    Set(),       Put(),     Remove(), Xmp(),     Commit(), Rollback(),
-            Pending(), Share(),  Latest(), Conflicts(), Resolve(), Diff(),   History(), Watch()};
+    return {Session(),  Status(),  Add(),   Ingest(), Set(),       Put(),     Remove(), Xmp(),     Commit(),
+            Rollback(), Pending(), Share(), Latest(), Conflicts(), Resolve(), Diff(),   History(), Watch()};
 }
 
 }  // namespace zo

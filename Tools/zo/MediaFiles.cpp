@@ -19,24 +19,7 @@ namespace {
 
 namespace fs = std::filesystem;
 
-constexpr std::uint64_t kLargestRendition = std::uint64_t(64) << 20;
 constexpr std::size_t kLongestLabel = 63;
-
-std::string ExtensionOf(const std::string& inName) {
-    const std::size_t dot = inName.rfind('.');
-    return dot == std::string::npos || dot == 0 ? std::string()
-                                                : ostcore::utility::FoldCaseASCII(inName.substr(dot + 1));
-}
-
-std::string RenditionTypeOf(const std::string& inName) {
-    static const std::map<std::string, std::string> table{{"jpg", "image/jpeg"},
-                                                          {"jpeg", "image/jpeg"},
-                                                          {"png", "image/png"},
-                                                          {"mp4", "video/mp4"},
-                                                          {"m4v", "video/mp4"}};
-    const auto found = table.find(ExtensionOf(inName));
-    return found == table.end() ? std::string() : found->second;
-}
 
 std::string SidecarOf(const fs::path& inPath) {
     fs::path stem = inPath;
@@ -51,8 +34,9 @@ std::string SidecarOf(const fs::path& inPath) {
     return {};
 }
 
+// Everything but letters, digits, the four marks and slashes.
 std::string PercentEncoded(const std::string& inText) {
-    static const std::string kPlain = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789-._~";
+    static const std::string kPlain = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789-._~/";
     std::string text;
     for (const char character : inText) {
         if (kPlain.find(character) != std::string::npos) {
@@ -87,15 +71,54 @@ MediaFile LookAt(const std::string& inPath, const std::string& inMountLabel) {
     }
     file.bytes = static_cast<std::uint64_t>(found.st_size);
     file.sidecar = SidecarOf(path);
-    file.renditionType = file.bytes <= kLargestRendition ? RenditionTypeOf(file.name) : std::string();
+    if (file.bytes <= kLargestRendition) {
+        file.renditionType = MediaTypeOfName(file.name).value_or("");
+    }
     const std::string label = inMountLabel.empty()
                                   ? fs::absolute(path).lexically_normal().parent_path().filename().string()
                                   : inMountLabel;
-    file.href = "zomedia://" + MountLabelFrom(label) + "/" + PercentEncoded(file.name);
+    file.href = MediaHRef(MountLabelFrom(label), file.name);
     return file;
 }
 
 }  // namespace
+
+std::string ExtensionOf(const std::string& inName) {
+    const std::size_t dot = inName.rfind('.');
+    return dot == std::string::npos || dot == 0 ? std::string()
+                                                : ostcore::utility::FoldCaseASCII(inName.substr(dot + 1));
+}
+
+std::optional<std::string> MediaTypeOfName(const std::string& inName) {
+    static const std::map<std::string, std::string> table{{"jpg", "image/jpeg"}, {"jpeg", "image/jpeg"},
+                                                          {"png", "image/png"},  {"mp4", "video/mp4"},
+                                                          {"m4v", "video/mp4"},  {"mov", ""},
+                                                          {"mxf", ""},           {"avi", ""},
+                                                          {"mkv", ""},           {"mts", ""},
+                                                          {"mpg", ""},           {"wav", ""},
+                                                          {"aif", ""},           {"aiff", ""},
+                                                          {"mp3", ""},           {"m4a", ""},
+                                                          {"flac", ""},          {"tif", ""},
+                                                          {"tiff", ""},          {"bmp", ""},
+                                                          {"gif", ""},           {"exr", ""},
+                                                          {"dpx", ""},           {"dng", ""}};
+    const auto found = table.find(ExtensionOf(inName));
+    return found == table.end() ? std::nullopt : std::optional(found->second);
+}
+
+bool LooksLike(std::string_view inBytes, const std::string& inRenditionType) {
+    if (inRenditionType == "image/jpeg") {
+        return inBytes.substr(0, 3) == "\xFF\xD8\xFF";
+    }
+    if (inRenditionType == "image/png") {
+        return inBytes.substr(0, 8) == "\x89PNG\r\n\x1A\n";
+    }
+    return inBytes.size() > 8 && inBytes.substr(4, 4) == "ftyp";
+}
+
+std::string MediaHRef(const std::string& inLabel, const std::string& inPath) {
+    return "zomedia://" + inLabel + "/" + PercentEncoded(inPath);
+}
 
 std::string MountLabelFrom(const std::string& inText) {
     std::string label;

@@ -3,6 +3,7 @@
 
 #include "Failure.h"
 #include "MediaFiles.h"
+#include "NewClip.h"
 #include "ostcore/utility/StringConversion.h"
 #include "Payloads.h"
 #include "Verbs.h"
@@ -30,136 +31,19 @@ std::string AddedLine(const MediaFile& inFile) {
     return "added " + inFile.name + (with.empty() ? "" : " with its " + with);
 }
 
-// One file on its way: locator, asset, sidecar and rendition, one request after the other. All on the main
-// thread.
-class FileOnItsWay : public std::enable_shared_from_this<FileOnItsWay> {
-public:
-    using Done = std::function<void(const FileOnItsWay&, const Failure*)>;
-
-    FileOnItsWay(Context& ioContext, const OpenTransaction& inTransaction, MediaFile inFile,
-                 ImmutableString inParent, Done inDone)
-        : mContext(ioContext),
-          mServer(ioContext.Server()),
-          mTransaction(inTransaction),
-          mFile(std::move(inFile)),
-          mParent(std::move(inParent)),
-          mDone(std::move(inDone)) {}
-
-    const MediaFile& File() const { return mFile; }
-    Json Record() const {
-        return AddedJson(mFile, mAssetID, mLocator->GetID().str(), ZOCL::kAssetType_MasterClip);
-    }
-
-    /// Ends with one call of the function, also when nothing could be started.
-    void Start() {
-        const ZOCL::Guid document = ZOCL::Guid::CreateUnique();
-        const ZOCL::Guid content = ZOCL::Guid::CreateUnique();
-        mLocator = mServer->GetMediaLocator(ZOCL::IZOCMediaLocator::CreateMediaLocatorID(document, content));
-        if (!mLocator) {
-            return Fail(Failure(ExitCode::Failure, What() + ": the hub keeps no media locators"));
-        }
-        mLocator->SetDocumentIDAndContentState(document, content);
-        mLocator->SetMediaHRef(ImmutableString(mFile.href));
-        mLocator->SetDisplayName(ImmutableString(mFile.name));
-        Step(
-            "telling where the media lies",
-            [this](const ZOCL::Guid& inRequest, const ZOCL::RequestCompletion& inCompletion) {
-                return mLocator->Store(inRequest, inCompletion);
-            },
-            &FileOnItsWay::OnLocatorStored);
-    }
-
-private:
-    using Next = void (FileOnItsWay::*)(const Outcome&);
-
-    std::string What() const { return "adding " + mFile.path; }
-
-    void Step(const char* inWhat, const StartFunction& inStart, Next inNext) {
-        const auto self = shared_from_this();
-        const auto server = mServer;
-        mContext.Loop().Start(
-            inStart, [server](const ZOCL::Guid& inRequest) { server->TryToCancelRequest(inRequest); },
-            [self, inWhat, inNext](const Outcome& inOutcome) {
-                self->OnStepDone(inWhat, inNext, inOutcome);
-            });
-    }
-
-    void OnStepDone(const char* inWhat, Next inNext, const Outcome& inOutcome) {
-        if (!inOutcome.Succeeded()) {
-            return Fail(Failure::OfRequest(What() + ", " + inWhat, inOutcome.result, inOutcome.response));
-        }
-        try {
-            (this->*inNext)(inOutcome);
-        } catch (const Failure& failure) {
-            Fail(failure);
-        } catch (const std::exception& error) {
-            Fail(Failure(ExitCode::Failure, What() + ": " + error.what()));
-        }
-    }
-
-    void OnLocatorStored(const Outcome&) {
-        ZOCL::AssetBaseProperties properties;
-        properties.name = ToUTF16(mFile.name);
-        properties.assetType = ZOCL::kAssetType_MasterClip;
-        properties.mediaLocator = mLocator->GetID();
-        properties.parent = mParent;
-        Step(
-            "making the asset",
-            [this, properties](const ZOCL::Guid& inRequest, const ZOCL::RequestCompletion& inCompletion) {
-                return mTransaction.transaction->CreateNewAsset(inRequest, inCompletion, properties);
-            },
-            &FileOnItsWay::OnAssetMade);
-    }
-
-    void OnAssetMade(const Outcome& inOutcome) {
-        const auto asset = RFL::QueryInterface<ZOCL::IZOCAsset>(inOutcome.resource);
-        mWritable = RFL::QueryInterface<ZOCL::IZOCWritableAsset>(inOutcome.resource);
-        if (!asset || !mWritable) {
-            return Fail(Failure(ExitCode::Failure, What() + ": the hub's answer is not what it should be"));
-        }
-        mAssetID = asset->GetAssetIdentifier().str();
-        if (mFile.sidecar.empty()) {
-            return OnSidecarWritten(inOutcome);
-        }
-        const Payload sidecar = ReadPayload(mFile.sidecar);
-        const ImmutableString name = ZOCL::GetXMPEnclosureName(mLocator->GetID());
-        Step(
-            "writing its sidecar",
-            [this, sidecar, name](const ZOCL::Guid& inRequest, const ZOCL::RequestCompletion& inCompletion) {
-                return ZOCL::CreateEnclosure(inRequest, mWritable->GetEnclosureFactoryURL(), mServer, name,
-                                             sidecar, inCompletion);
-            },
-            &FileOnItsWay::OnSidecarWritten);
-    }
-
-    void OnSidecarWritten(const Outcome& inOutcome) {
-        if (mFile.renditionType.empty()) {
-            return OnRenditionWritten(inOutcome);
-        }
-        const Payload bytes = ReadPayload(mFile.path);
-        Step(
-            "writing its rendition",
-            [this, bytes](const ZOCL::Guid& inRequest, const ZOCL::RequestCompletion& inCompletion) {
-                return ZOCL::IZOCWritableRenditions::CreateRendition(
-                    mServer, mWritable->GetRenditionFactoryURL(), ImmutableString(mFile.renditionType), bytes,
-                    inRequest, inCompletion);
-            },
-            &FileOnItsWay::OnRenditionWritten);
-    }
-
-    void OnRenditionWritten(const Outcome&) { mDone(*this, nullptr); }
-    void Fail(const Failure& inFailure) { mDone(*this, &inFailure); }
-
-    Context& mContext;
-    const ZOCL::InterfaceRef<ZOCL::IZOCDataServer> mServer;
-    const OpenTransaction mTransaction;
-    const MediaFile mFile;
-    const ImmutableString mParent;
-    const Done mDone;
-    ZOCL::InterfaceRef<ZOCL::IZOCMediaLocator> mLocator;
-    ZOCL::InterfaceRef<ZOCL::IZOCWritableAsset> mWritable;
-    std::string mAssetID;
-};
+NewClip ClipOf(const MediaFile& inFile, const ImmutableString& inParent) {
+    NewClip clip;
+    clip.path = inFile.path;
+    clip.name = inFile.name;
+    clip.document = ZOCL::Guid::CreateUnique();
+    clip.contentState = ZOCL::Guid::CreateUnique();
+    clip.href = inFile.href;
+    clip.parent = inParent;
+    clip.sidecar = inFile.sidecar.empty() ? nullptr : ReadPayload(inFile.sidecar);
+    clip.renditionType = inFile.renditionType;
+    clip.rendition = inFile.renditionType.empty() ? nullptr : ReadPayload(inFile.path);
+    return clip;
+}
 
 // Several files at a time; after the first failure no further one is begun.
 class FileAdder {
@@ -185,25 +69,37 @@ public:
 private:
     void StartMore() {
         while (!mWaiting.empty() && !mFailure && mUnderWay < kFilesAtOnce) {
-            MediaFile file = std::move(mWaiting.front());
+            const MediaFile file = std::move(mWaiting.front());
             mWaiting.pop_front();
-            ++mUnderWay;
-            const auto one = std::make_shared<FileOnItsWay>(
-                mContext, mTransaction, std::move(file), mParent,
-                [this](const FileOnItsWay& inFile, const Failure* inFailure) { OnDone(inFile, inFailure); });
-            one->Start();
+            try {
+                StartOne(file);
+            } catch (const Failure& failure) {
+                mFailure = std::make_unique<Failure>(failure);
+            }
         }
     }
 
-    void OnDone(const FileOnItsWay& inFile, const Failure* inFailure) {
+    void StartOne(const MediaFile& inFile) {
+        const auto one = std::make_shared<ClipOnItsWay>(
+            mContext, mTransaction, ClipOf(inFile, mParent),
+            [this, inFile](const ClipOnItsWay& inClip, const Failure* inFailure) {
+                OnDone(inFile, inClip, inFailure);
+            });
+        ++mUnderWay;
+        one->Start();
+    }
+
+    void OnDone(const MediaFile& inFile, const ClipOnItsWay& inClip, const Failure* inFailure) {
         --mUnderWay;
         if (inFailure) {
             mFailure = mFailure ? std::move(mFailure) : std::make_unique<Failure>(*inFailure);
             return;
         }
-        mWritten.Add(inFile.Record(), AddedLine(inFile.File()));
-        mBytes += inFile.File().bytes;
-        mContext.Out().Progress(inFile.File().name, ++mDone, mTotal, mBytes);
+        mWritten.Add(AddedJson(inFile, inClip.AssetID(), LocatorIDOf(inClip.Clip()).str(),
+                               ZOCL::kAssetType_MasterClip),
+                     AddedLine(inFile));
+        mBytes += inFile.bytes;
+        mContext.Out().Progress(inFile.name, ++mDone, mTotal, mBytes);
         StartMore();
     }
 

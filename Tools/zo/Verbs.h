@@ -17,6 +17,7 @@ void RunGet(Context& ioContext);
 void RunSession(Context& ioContext);
 void RunStatus(Context& ioContext);
 void RunAdd(Context& ioContext);
+void RunIngest(Context& ioContext);
 void RunSet(Context& ioContext);
 void RunPut(Context& ioContext);
 void RunRemove(Context& ioContext);
