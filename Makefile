@@ -6,7 +6,7 @@ BENCH := $(NAME)
 export CCACHE_BASEDIR := $(CURDIR)
 export CCACHE_NOHASHDIR := 1
 
-.PHONY: demo test bench packages build release asan tsan analysis format format-check tidy clean
+.PHONY: demo test bench compare packages build release asan tsan analysis format format-check tidy clean
 
 packages:
 	@Packaging/install-packages.sh
@@ -28,6 +28,10 @@ release: packages
 # All benchmarks, or one: make bench NAME=requests
 bench: release
 	@python3 Benchmarks/run.py build/release $(BENCH)
+
+# The same files in zo, git and Subversion, side by side; needs the packages git and subversion.
+compare: release
+	@python3 Benchmarks/versioning/compare.py build/release
 
 asan tsan: packages
 	cmake --preset $@ >/dev/null
