@@ -165,12 +165,13 @@ private:
 class Report {
 public:
     Report(const char* inSchema, const Packet& inPacket) : mNames(inPacket) {
-        mText = std::string("{\"schema\":\"") + inSchema + "\",\"version\":" + std::to_string(kVersion);
+        mText.append("{\"schema\":\"").append(inSchema).append("\",\"version\":");
+        mText.append(std::to_string(kVersion));
     }
 
     template <class Entries, class Write>
     void AddList(const char* inKey, const Entries& inEntries, const Write& inWrite) {
-        mText += std::string(",\"") + inKey + "\":[";
+        mText.append(",\"").append(inKey).append("\":[");
         bool isFirst = true;
         for (const auto& entry : inEntries) {
             if (mText.size() > kLongestReport) {
