@@ -6,7 +6,10 @@ BENCH := $(NAME)
 export CCACHE_BASEDIR := $(CURDIR)
 export CCACHE_NOHASHDIR := 1
 
-.PHONY: demo test bench compare packages build release asan tsan analysis format format-check tidy clean
+# By its list of headers, without a run of the preprocessor before each compilation.
+export CCACHE_DEPEND := 1
+
+.PHONY: demo test soak bench compare packages build release asan tsan analysis format format-check locks tidy clean
 
 packages:
 	@Packaging/install-packages.sh
@@ -21,6 +24,11 @@ demo: build
 test: build
 	ctest --preset dev -j $(JOBS)
 
+# The tests of the request chain again and again, until one fails: make soak COUNT=1000
+COUNT ?= 100
+soak: build
+	@python3 Tools/dev/soak.py build/dev $(COUNT)
+
 release: packages
 	cmake --preset release >/dev/null
 	cmake --build --preset release -j $(JOBS)
@@ -33,10 +41,14 @@ bench: release
 compare: release
 	@python3 Benchmarks/versioning/compare.py build/release
 
-asan: LEFT_OUT := build
-tsan: LEFT_OUT := build|words
+# The label words: programs whose words and files are looked at; single: one thread and no other. The thread
+# sanitizer leaves zo out too, which starts anew for each command (label e2e): make tsan ZO=1 takes it along.
+asan: LEFT_OUT := build|words
+tsan: LEFT_OUT := build|words|single$(if $(ZO),,|e2e)
+# QT=OFF leaves the Qt windows out; HUB=PATH takes that zohub for the tests and leaves out the hub's own.
+QT ?= ON
 asan tsan: packages
-	cmake --preset $@ >/dev/null
+	cmake --preset $@ -D ZO_BUILD_QT=$(QT) -D ZO_HUB_PROGRAM=$(HUB) >/dev/null
 	cmake --build --preset $@ -j $(JOBS)
 	ctest --preset $@ -j $(JOBS) -LE '$(LEFT_OUT)'
 
@@ -47,15 +59,19 @@ analysis: packages
 
 SOURCES = $(shell git ls-files '*.h' '*.cpp')
 format:
-	clang-format -i $(SOURCES)
+	@clang-format -i $(SOURCES)
 format-check:
-	clang-format --dry-run -Werror $(SOURCES)
+	@clang-format --dry-run -Werror $(SOURCES)
 
-# The same warnings and clang-tidy's in one pass over each file, so a whole build is not needed first.
+# The same over the sources in groups, without making any code of them.
+locks: packages
+	cmake --preset analysis -B build/locks -D ZO_UNITY_BUILD=ON >/dev/null
+	python3 Tools/dev/tidy.py --locks build/locks
+
+# clang-tidy over all sources, or over those that changed since a commit: make tidy SINCE=HEAD~20
 tidy: packages
 	cmake --preset analysis >/dev/null
-	cmake --build --preset analysis -j $(JOBS) --target zo_pch
-	python3 Tools/dev/tidy.py build/analysis
+	python3 Tools/dev/tidy.py $(if $(SINCE),--since $(SINCE)) build/analysis
 
 clean:
 	rm -rf build

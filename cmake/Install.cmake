@@ -16,7 +16,17 @@ install(TARGETS ${zo_libraries} EXPORT ZOClientTargets
   INCLUDES DESTINATION ${zo_include_dir})
 install(EXPORT ZOClientTargets NAMESPACE ZOClient:: DESTINATION ${zo_package_dir})
 
-install(DIRECTORY ${PROJECT_SOURCE_DIR}/API/Inc/ DESTINATION ${zo_include_dir} FILES_MATCHING PATTERN "*.h")
+install(DIRECTORY ${PROJECT_SOURCE_DIR}/API/Inc/ DESTINATION ${zo_include_dir}
+  FILES_MATCHING PATTERN "*.h" PATTERN "ZOClientQt" EXCLUDE)
+if(TARGET ZOClientQt)
+  # A component of its own, find_package(ZOClient COMPONENTS Qt), so that other hosts never look at it.
+  set_target_properties(ZOClientQt PROPERTIES INSTALL_RPATH "$ORIGIN")
+  install(TARGETS ZOClientQt EXPORT ZOClientQtTargets
+    LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR}
+    INCLUDES DESTINATION ${zo_include_dir})
+  install(EXPORT ZOClientQtTargets NAMESPACE ZOClient:: DESTINATION ${zo_package_dir})
+  install(DIRECTORY ${PROJECT_SOURCE_DIR}/API/Inc/ZOClientQt DESTINATION ${zo_include_dir} FILES_MATCHING PATTERN "*.h")
+endif()
 install(DIRECTORY ${PROJECT_SOURCE_DIR}/Platform/ DESTINATION ${zo_include_dir}
   FILES_MATCHING PATTERN "*.h" PATTERN "detail" EXCLUDE)
 

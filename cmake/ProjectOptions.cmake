@@ -38,8 +38,19 @@ endif()
 if(ZO_SANITIZE)
   add_compile_options(-fsanitize=${ZO_SANITIZE} -fno-omit-frame-pointer)
   add_link_options(-fsanitize=${ZO_SANITIZE})
+  if(CMAKE_CXX_COMPILER_ID MATCHES "Clang")
+    # gcc says so by itself.
+    if(ZO_SANITIZE MATCHES "address")
+      add_compile_definitions(__SANITIZE_ADDRESS__=1)
+    elseif(ZO_SANITIZE MATCHES "thread")
+      add_compile_definitions(__SANITIZE_THREAD__=1)
+    endif()
+  endif()
   if(ZO_SANITIZE MATCHES "undefined")
     add_compile_options(-fno-sanitize-recover=undefined)
+    if(CMAKE_CXX_COMPILER_ID MATCHES "Clang")
+      add_compile_options(-fno-sanitize=function)  # what clang 14 writes for it its own assembler refuses
+    endif()
   endif()
 endif()
 
@@ -48,7 +59,6 @@ if(ZO_BUILD_FUZZERS)
   add_compile_options(-fsanitize=fuzzer-no-link)
 endif()
 
-# Asio hands executors over as templates by default; one polymorphic kind keeps compile times down.
 add_compile_definitions(BOOST_BIND_GLOBAL_PLACEHOLDERS)
 
 find_package(Threads REQUIRED)

@@ -6,7 +6,7 @@ import sys
 
 OURS = {
     0: re.compile(r"\bZOCL::"),
-    1: re.compile(r"\b(ostcore|ostnet|RFL|zourl|HLM|ostmarshal|ostmediatypes|ostui|ostnetsync|QM|OrvaneXMP\w*)::"),
+    1: re.compile(r"\b(ostcore|ostnet|RFL|zourl|HLM|ostmarshal|ostmediatypes|ostui|ostlyra|ostnetsync|QM|OrvaneXMP\w*)::"),
 }
 # Strong symbols that must be visible, or nothing works; they show that the test reads what it believes.
 WANTED = {

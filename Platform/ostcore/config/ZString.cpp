@@ -114,13 +114,16 @@ bool Localizer::LoadDictionary(std::string_view inLanguage, const std::string& i
     if (!content) {
         return false;
     }
-    std::string_view text = content->view();
-    constexpr std::string_view kByteOrderMark = "\xEF\xBB\xBF";
-    if (text.substr(0, kByteOrderMark.size()) == kByteOrderMark) {
-        text.remove_prefix(kByteOrderMark.size());
-    }
-    TheDictionaries().Add(inLanguage, ParseDictionary(text));
+    LoadDictionaryFromMemory(inLanguage, content->view());
     return true;
+}
+
+void Localizer::LoadDictionaryFromMemory(std::string_view inLanguage, std::string_view inText) {
+    constexpr std::string_view kByteOrderMark = "\xEF\xBB\xBF";
+    if (inText.substr(0, kByteOrderMark.size()) == kByteOrderMark) {
+        inText.remove_prefix(kByteOrderMark.size());
+    }
+    TheDictionaries().Add(inLanguage, ParseDictionary(inText));
 }
 
 }  // namespace config

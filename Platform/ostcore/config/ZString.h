@@ -22,6 +22,8 @@ public:
     /// Adds the entries of a UTF-8 file, lines of `$$$/Library/Path=text` in which \n, \t and \\ are escapes;
     /// `#` begins a comment line. Later entries replace former ones. False: the file could not be read.
     static bool LoadDictionary(std::string_view inLanguage, const std::string& inPath);
+    /// The same from a text that is at hand.
+    static void LoadDictionaryFromMemory(std::string_view inLanguage, std::string_view inText);
     static void AddText(std::string_view inLanguage, std::string_view inKey, std::string_view inText);
     /// Forgets all dictionaries and the language.
     static void Reset();

@@ -89,15 +89,16 @@ private:
     void Run(Job& ioJob);
     void CompleteAnswered(const std::shared_ptr<Exchange>& inExchange);
     void CompleteCancelled(Exchange& ioExchange);
+    void EndCancelled(const std::shared_ptr<Exchange>& inExchange);
     bool TakeOut(const std::shared_ptr<Exchange>& inExchange);
     bool IsRegistered(const Exchange& inExchange) const;
-    Register CloseRegister();
 
     const SettingsSource mSettings;
 
     mutable Mutex mMutex;
     Register mRegister ZO_GUARDED_BY(mMutex);
     bool mIsShut ZO_GUARDED_BY(mMutex) = false;
+    bool mIsAbandoned ZO_GUARDED_BY(mMutex) = false;
 
     std::atomic<std::uint64_t> mStarted{0}, mCompleted{0}, mCancelled{0};
     std::atomic<std::uint64_t> mConnectionsOpened{0}, mBytesReceived{0}, mBytesSent{0};
@@ -154,24 +155,36 @@ void NetworkProcessor::Core::Cancel(const Guid& inRequestID) {
     Register::node_type node;
     {
         MutexLock lock(mMutex);
+        if (mIsAbandoned) {
+            return;
+        }
         node = mRegister.extract(inRequestID);
     }
-    if (node.empty()) {
-        return;
+    if (!node.empty()) {
+        EndCancelled(node.mapped());
     }
-    mNetwork.Drop(node.mapped());
-    mWorkers.Post({Job::Kind::kCancelled, std::move(node.mapped()), {}});
+}
+
+/// For whoever has taken the exchange out of the register. A cancel that meets the end of the workers
+/// completes its request itself: none but it knows of the request any more.
+void NetworkProcessor::Core::EndCancelled(const std::shared_ptr<Exchange>& inExchange) {
+    mNetwork.Drop(inExchange);
+    if (!mWorkers.Post({Job::Kind::kCancelled, inExchange, {}})) {
+        CompleteCancelled(*inExchange);
+    }
 }
 
 void NetworkProcessor::Core::CancelAll() {
     Register taken;
     {
         MutexLock lock(mMutex);
+        if (mIsAbandoned) {
+            return;
+        }
         taken.swap(mRegister);
     }
-    for (auto& [id, exchange] : taken) {
-        mNetwork.Drop(exchange);
-        mWorkers.Post({Job::Kind::kCancelled, std::move(exchange), {}});
+    for (const auto& [id, exchange] : taken) {
+        EndCancelled(exchange);
     }
 }
 
@@ -285,6 +298,7 @@ void NetworkProcessor::Core::Abandon() {
     {
         MutexLock lock(mMutex);
         mIsShut = true;
+        mIsAbandoned = true;
     }
     mNetwork.Stop();
     mWorkers.Abandon(kPatienceAtProcessEnd);

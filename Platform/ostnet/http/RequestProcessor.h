@@ -47,8 +47,13 @@ constexpr std::uint32_t kWaitForever = 0xFFFFFFFFu;
 /// Threads: any thread may call any operation.
 class ZOPLATFORM_EXPORT RequestProcessor {
 public:
-    /// Best effort: a request that is held here ends with status -1; otherwise the next layer is asked.
-    /// An unknown ID has no effect.
+    /// A request that is held here ends with status -1; otherwise the next layer is asked. An unknown ID has
+    /// no effect.
+    ///
+    /// After the start has returned, a cancel finds its request wherever that is: it ends with status -1, or
+    /// with its answer when that is on its way up already, and a failed or refused request is not sent again.
+    /// Only a sending that another thread has begun meanwhile can still reach the network, where it is
+    /// cancelled at once. A cancel that comes while the start is under way may find nothing.
     virtual void TryToCancelRequest(const Guid& inRequestID) = 0;
     virtual bool GET(const Guid& inRequestID, const CompletionFunction& inCompletion,
                      const ImmutableString& inURL, Headers inHeaders, const RequestOptions& inOptions) = 0;

@@ -62,6 +62,10 @@ public:
 
     const Request& GetRequest() const noexcept { return mRequest; }
 
+    /// Notes, on any thread, that nobody wants the transfer any more; one that has not begun never will.
+    void MarkDropped() noexcept { mIsDropped = true; }
+    bool IsDropped() const noexcept { return mIsDropped; }
+
     /// For the owner of the completion: hands it over, and leaves none.
     CompletionFunction TakeCompletion() noexcept { return std::exchange(mCompletion, CompletionFunction()); }
 
@@ -106,6 +110,7 @@ private:
     const Request mRequest;
     HeaderLines mHeaderLines;
     CompletionFunction mCompletion;
+    std::atomic<bool> mIsDropped{false};
 
     CURL* mHandle = nullptr;
     CURLcode mRefusal = CURLE_OK;

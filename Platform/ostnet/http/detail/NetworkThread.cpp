@@ -155,6 +155,7 @@ bool NetworkThread::Begin(std::shared_ptr<Exchange> inExchange) {
 }
 
 void NetworkThread::Drop(std::shared_ptr<Exchange> inExchange) {
+    inExchange->MarkDropped();
     Give(std::move(inExchange), &Orders::drop);
 }
 
@@ -358,6 +359,9 @@ void NetworkThread::BeginWaiting() {
 }
 
 void NetworkThread::BeginTransfer(std::shared_ptr<Exchange> inExchange) {
+    if (inExchange->IsDropped()) {
+        return;  // by a cancel whose order came before that to begin
+    }
     const auto now = Clock::now();
     const auto& settings = inExchange->GetRequest().settings;
     const auto shortest = std::chrono::milliseconds(
