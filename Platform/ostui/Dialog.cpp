@@ -1,173 +1,73 @@
-// Controls, and the life of a modal run.
+// The life of a modal run, and what the user does in it.
 #include "ostui/Dialog.h"
 
-#include <algorithm>
+#include <utility>
 
 #include "ostcore/threads/MainThread.h"
 #include "ostui/BackEnd.h"
+#include "ostui/detail/RunningDialogs.h"
 
 namespace ostui {
 namespace {
 
-void Wipe(U8String& ioText) {
-    volatile char* bytes = ioText.data();
-    for (std::size_t i = 0; i < ioText.size(); ++i) {
-        bytes[i] = 0;
-    }
-    ioText.clear();
+bool IsEdit(ControlType inType) noexcept {
+    return inType == ControlType::kTextEdit || inType == ControlType::kPasswordEdit ||
+           inType == ControlType::kSearchEdit;
 }
+
+/// Sets a mark for a scope.
+class Mark {
+public:
+    explicit Mark(bool& ioMark) : mMark(ioMark) { mMark = true; }
+    ~Mark() { mMark = false; }
+    Mark(const Mark&) = delete;
+    Mark& operator=(const Mark&) = delete;
+
+private:
+    bool& mMark;
+};
 
 }  // namespace
-
-Dialog::Dialog(std::string inID, U8String inTitle) : mID(std::move(inID)), mTitle(std::move(inTitle)) {}
-
-Dialog::~Dialog() {
-    for (Control& control : mControls) {
-        if (control.type == ControlType::kPasswordEdit) {
-            Wipe(control.text);
-        }
-    }
-}
-
-Control& Dialog::Add(ControlType inType, const std::string& inID) {
-    Control control;
-    control.type = inType;
-    control.id = inID;
-    mControls.push_back(std::move(control));
-    mHandlers.emplace_back();
-    return mControls.back();
-}
-
-void Dialog::AddStaticText(const std::string& inID, U8String inText) {
-    Add(ControlType::kStaticText, inID).text = std::move(inText);
-}
-
-void Dialog::AddTextEdit(const std::string& inID, U8String inLabel, U8String inText) {
-    Control& control = Add(ControlType::kTextEdit, inID);
-    control.label = std::move(inLabel);
-    control.text = std::move(inText);
-}
-
-void Dialog::AddPasswordEdit(const std::string& inID, U8String inLabel) {
-    Add(ControlType::kPasswordEdit, inID).label = std::move(inLabel);
-}
-
-void Dialog::AddList(const std::string& inID, U8String inLabel, std::vector<U8String> inItems) {
-    Control& control = Add(ControlType::kList, inID);
-    control.label = std::move(inLabel);
-    control.items = std::move(inItems);
-}
-
-void Dialog::AddProgressBar(const std::string& inID) {
-    Add(ControlType::kProgressBar, inID);
-}
-
-void Dialog::AddButton(const std::string& inID, U8String inText, int inResponse) {
-    AddButton(inID, std::move(inText), [this, inResponse] { Close(inResponse); });
-}
-
-void Dialog::AddButton(const std::string& inID, U8String inText, function<void()> inOnPressed) {
-    Add(ControlType::kButton, inID).text = std::move(inText);
-    mHandlers.back().swap(inOnPressed);
-}
-
-void Dialog::SetCancelButton(const std::string& inID) {
-    mCancelButton = inID;
-}
-
-void Dialog::SetDefaultButton(const std::string& inID) {
-    mDefaultButton = inID;
-}
-
-void Dialog::SetClosesByItself() {
-    mClosesByItself = true;
-}
-
-const Control* Dialog::Find(const std::string& inID) const {
-    const auto found = std::find_if(mControls.begin(), mControls.end(),
-                                    [&](const Control& inControl) { return inControl.id == inID; });
-    return found == mControls.end() ? nullptr : &*found;
-}
-
-Control* Dialog::FindUsable(const std::string& inID) {
-    Control* const control = const_cast<Control*>(Find(inID));
-    return control && control->isVisible && control->isEnabled ? control : nullptr;
-}
-
-template <class Change>
-void Dialog::ChangeControl(const std::string& inID, const Change& inChange) {
-    if (Control* const control = const_cast<Control*>(Find(inID))) {
-        inChange(*control);
-        Tell(inID);
-    }
-}
-
-void Dialog::Tell(const std::string& inID) {
-    const shared_ptr<BackEnd> backEnd = mIsRunning ? GetBackEnd() : nullptr;
-    const Control* const control = Find(inID);
-    if (backEnd && control) {
-        backEnd->OnControlChanged(*this, *control);
-    }
-}
-
-void Dialog::SetText(const std::string& inID, U8String inText) {
-    ChangeControl(inID, [&](Control& ioControl) {
-        if (ioControl.type == ControlType::kPasswordEdit) {
-            Wipe(ioControl.text);
-        }
-        ioControl.text = std::move(inText);
-    });
-}
-
-void Dialog::SetItems(const std::string& inID, std::vector<U8String> inItems) {
-    ChangeControl(inID, [&](Control& ioControl) {
-        ioControl.items = std::move(inItems);
-        ioControl.selection = -1;
-    });
-}
-
-void Dialog::SetProgress(const std::string& inID, std::uint32_t inValue, std::uint32_t inTotal) {
-    ChangeControl(inID, [&](Control& ioControl) {
-        ioControl.value = std::min(inValue, inTotal);
-        ioControl.total = inTotal;
-    });
-}
-
-void Dialog::SetEnabled(const std::string& inID, bool inIsEnabled) {
-    ChangeControl(inID, [&](Control& ioControl) { ioControl.isEnabled = inIsEnabled; });
-}
-
-void Dialog::SetVisible(const std::string& inID, bool inIsVisible) {
-    ChangeControl(inID, [&](Control& ioControl) { ioControl.isVisible = inIsVisible; });
-}
-
-U8String Dialog::GetText(const std::string& inID) const {
-    const Control* const control = Find(inID);
-    return control ? control->text : U8String();
-}
-
-int Dialog::GetSelection(const std::string& inID) const {
-    const Control* const control = Find(inID);
-    return control ? control->selection : -1;
-}
 
 int Dialog::RunModal() {
     if (!ostcore::threads::IsMainThread() || mIsRunning) {
         return kResponseNone;
     }
-    mIsRunning = true;
+    {
+        const Mark running(mIsRunning);
+        const detail::RunningDialog counted(*this);
+        mIsOpened = false;
+        Show();
+    }
+    return mResponse.exchange(kStillOpen);
+}
+
+void Dialog::Show() {
     const shared_ptr<BackEnd> backEnd = GetBackEnd();
     if (IsClosed()) {
         // Its occasion has passed before it could be shown.
     } else if (backEnd) {
         backEnd->RunModal(*this);
     } else if (mClosesByItself) {
+        TellOpened();
         PumpUntilClosed(*this);
     } else {
         Dismiss();
     }
-    mIsRunning = false;
-    return mResponse.exchange(kStillOpen);
+}
+
+void Dialog::TellOpened() {
+    const function<void()> onOpened = mOnOpened;
+    if (mIsRunning && !std::exchange(mIsOpened, true) && onOpened) {
+        onOpened();
+    }
+}
+
+void Dialog::TellBackEnd() {
+    const shared_ptr<BackEnd> backEnd = mIsRunning ? GetBackEnd() : nullptr;
+    if (backEnd) {
+        backEnd->OnDialogChanged(*this);
+    }
 }
 
 void Dialog::Close(int inResponse) {
@@ -181,36 +81,77 @@ bool Dialog::IsClosed() const noexcept {
     return mResponse != kStillOpen;
 }
 
-bool Dialog::Press(const std::string& inButton) {
-    const Control* const button = FindUsable(inButton);
-    if (!button || button->type != ControlType::kButton || IsClosed()) {
-        return false;
-    }
-    const function<void()> handler = mHandlers[static_cast<std::size_t>(button - mControls.data())];
+Control* Dialog::FindUsable(const std::string& inID) {
+    Control* const control = const_cast<Control*>(Find(inID));
+    return control && !IsClosed() && IsUsable(*control) ? control : nullptr;
+}
+
+void Dialog::CallHandler(const Control& inControl) {
+    // A copy, since it may be replaced from within.
+    const function<void()> handler = mHandlers[static_cast<std::size_t>(&inControl - mControls.data())];
     if (handler) {
         handler();
     }
+}
+
+bool Dialog::Press(const std::string& inButton) {
+    const Control* const button = FindUsable(inButton);
+    if (!button || button->type != ControlType::kButton) {
+        return false;
+    }
+    CallHandler(*button);
     return true;
 }
 
 bool Dialog::Enter(const std::string& inEdit, U8String inText) {
-    Control* const edit = FindUsable(inEdit);
-    if (!edit || (edit->type != ControlType::kTextEdit && edit->type != ControlType::kPasswordEdit)) {
+    const Control* const edit = FindUsable(inEdit);
+    if (!edit || !IsEdit(edit->type)) {
         return false;
     }
+    const bool isChanged = edit->text != inText;
     SetText(inEdit, std::move(inText));
+    if (isChanged) {
+        CallHandler(*edit);
+    }
     return true;
 }
 
 bool Dialog::Select(const std::string& inList, int inRow) {
-    Control* const list = FindUsable(inList);
-    if (!list || list->type != ControlType::kList || inRow < -1 ||
-        inRow >= static_cast<int>(list->items.size())) {
+    Control* const choice = FindUsable(inList);
+    const bool isNone = choice && inRow == -1 && choice->type == ControlType::kList;
+    if (!choice || (!isNone && !choice->HasItem(inRow)) || !choice->IsItemEnabled(inRow)) {
         return false;
     }
-    list->selection = inRow;
+    if (choice->type == ControlType::kTabs) {
+        const Control* const page = Find(choice->itemIDs[static_cast<std::size_t>(inRow)]);
+        if (page && !IsUsable(*page)) {
+            return false;
+        }
+    }
+    const bool isChanged = std::exchange(choice->selection, inRow) != inRow;
     Tell(inList);
+    if (isChanged) {
+        CallHandler(*choice);
+    }
     return true;
+}
+
+bool Dialog::Check(const std::string& inCheckBox, bool inIsChecked) {
+    Control* const box = FindUsable(inCheckBox);
+    if (!box || box->type != ControlType::kCheckBox) {
+        return false;
+    }
+    const bool isChanged = std::exchange(box->isChecked, inIsChecked) != inIsChecked;
+    Tell(inCheckBox);
+    if (isChanged) {
+        CallHandler(*box);
+    }
+    return true;
+}
+
+bool Dialog::SelectRows(const std::string& inTree, const std::vector<int>& inRows) {
+    const Control* const control = FindUsable(inTree);
+    return control && control->tree && control->tree->Select(inRows);
 }
 
 void Dialog::Dismiss() {

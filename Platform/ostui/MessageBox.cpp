@@ -8,6 +8,7 @@ namespace ostui {
 
 const char* const kMessageBoxID = "MessageBox";
 const char* const kMessageBoxText = "messageText";
+const char* const kMessageBoxImage = "messageImage";
 
 namespace {
 
@@ -44,6 +45,20 @@ U8String TextOf(const StandardButton& inButton, const MessageBoxSettings& inSett
 
 }  // namespace
 
+std::string GetMessageBoxIconName(MessageBoxIcon inIcon) {
+    switch (inIcon) {
+        case MessageBoxIcon::kNote:
+            return "MessageBoxNote";
+        case MessageBoxIcon::kCaution:
+            return "MessageBoxCaution";
+        case MessageBoxIcon::kStop:
+            return "MessageBoxStop";
+        case MessageBoxIcon::kNone:
+            break;
+    }
+    return {};
+}
+
 std::string GetMessageBoxButtonID(int inButton) {
     for (const StandardButton& standard : kStandardButtons) {
         if (standard.button == inButton) {
@@ -59,6 +74,9 @@ int RunMessageBox(const MessageBoxSettings& inSettings) {
     }
     const int harmless = MostHarmless(inSettings.buttons);
     Dialog dialog(kMessageBoxID, inSettings.title);
+    if (inSettings.icon != MessageBoxIcon::kNone) {
+        dialog.AddImage(kMessageBoxImage, GetMessageBoxIconName(inSettings.icon));
+    }
     dialog.AddStaticText(kMessageBoxText, inSettings.message);
     for (const StandardButton& standard : kStandardButtons) {
         if ((inSettings.buttons | harmless) & standard.button) {

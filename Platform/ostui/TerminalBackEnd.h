@@ -16,11 +16,20 @@ struct TerminalSettings {
     ostcore::function<bool()> isInterrupted;
 };
 
-/// Writes what a dialog reads and asks for each edit and list and at last for a button, one line each;
-/// passwords are not echoed. The main thread's queue is pumped while it waits. A dialog that closes by itself
-/// shows its text and its progress, and takes a button at any time; what it says is shown to a terminal only.
-/// Off a terminal nothing is written and no question is asked: such a dialog is waited for, any other one is
-/// dismissed. The end of the input dismisses, too.
+/// Goes through the controls of a dialog in their order: writes what is to be read, asks what is to be
+/// answered, and at last for a button, one line each. Trees are tables, of which rows are chosen by their
+/// numbers ("1,3-5", "all"); lists, popups and radio groups are chosen from by number or text; a text of
+/// several lines ends with an empty line. A text that ends with a colon right before an edit or a value
+/// without a label is its label. Long texts are broken between words. Passwords are not echoed. What is
+/// hidden or disabled is not asked, and a picture is left out; the pages of tabs follow one another. When a
+/// dialog stays open, the next round begins, in which the enter key keeps each answer; so it does when
+/// something changes that can be answered, and by the enter key where that presses no button.
+///
+/// The main thread's queue is pumped while it waits. A dialog that closes by itself, or has a bar and nothing
+/// to answer, shows its text and its progress, and takes a button at any time; what it says is shown to a
+/// terminal only. Off a terminal nothing is written and no question is asked: a dialog that closes by itself
+/// is waited for, any other one is dismissed. The end of the input dismisses, too. Nothing of what is shown
+/// can steer the terminal.
 ZOPLATFORM_EXPORT shared_ptr<BackEnd> CreateTerminalBackEnd(const TerminalSettings& inSettings);
 
 }  // namespace ostui
