@@ -1,6 +1,8 @@
 // How the connection floor makes objects of the floors above it without knowing them.
 #pragma once
 
+#include <atomic>
+
 #include "ZOClient/IZOCDataServer.h"
 
 namespace ZOCL {
@@ -38,15 +40,19 @@ public:
 };
 
 class CollaborationFactory;
+class OutageMinder;
 class PollCancellation;
 
-/// What the composition root puts in place; each pointer is null before Initialize and after Shutdown.
+/// What the composition root puts in place; each pointer is null before Initialize and after Shutdown. What
+/// they point to lives as long as the process.
 struct CompositionRoot {
-    ResourceFactory* resources = nullptr;
-    CollaborationFactory* collaboration = nullptr;
-    PollCancellation* polls = nullptr;
+    std::atomic<ResourceFactory*> resources{nullptr};
+    std::atomic<CollaborationFactory*> collaboration{nullptr};
+    std::atomic<OutageMinder*> outages{nullptr};
+    std::atomic<PollCancellation*> polls{nullptr};
 };
-/// Written by Initialize and Shutdown on the main thread only, read anywhere between the two.
+/// Written by Initialize and Shutdown on the main thread only. Read on any thread at any time: an operation
+/// that Shutdown has cut off may still come to its end.
 CompositionRoot& GetCompositionRoot();
 
 }  // namespace ZOCL

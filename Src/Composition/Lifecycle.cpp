@@ -3,12 +3,14 @@
 #include "Collaboration/CollaborationResources.h"
 #include "Connection/AutoAuthentication.h"
 #include "Connection/ContentCache.h"
+#include "Dialogs/CloseModalDialogs.h"
 #include "Frame/Station.h"
 #include "Frame/SyslogLogger.h"
 #include "Model/ModelResourceFactory.h"
 #include "OrvaneXMPCompareAndMerge/Library.h"
 #include "ostcore/threads/MainThread.h"
 #include "ostnet/http/NetworkProcessor.h"
+#include "OutageMinder.h"
 #include "PollCancellation.h"
 #include "ResourceFactory.h"
 #include "Resources/PollingResourceMonitor.h"
@@ -35,6 +37,7 @@ void Initialize() {
     OrvaneXMPCompareAndMerge::StartLibrary();
     GetCompositionRoot().resources = GetModelResourceFactory();
     GetCompositionRoot().collaboration = GetCollaborationFactory();
+    GetCompositionRoot().outages = GetOutageMinder();
     GetCompositionRoot().polls = GetPollCancellation();
 }
 
@@ -42,6 +45,7 @@ void Shutdown() {
     if (gInitCount-- != 1) {
         return;
     }
+    StopClosingModalDialogs();
     StopAutoAuthentication();
     ResetSyslogLogger();
     SetCurrentZOSandbox(nullptr);
@@ -52,6 +56,7 @@ void Shutdown() {
     ostnet::Shutdown();
     GetCompositionRoot().resources = nullptr;
     GetCompositionRoot().collaboration = nullptr;
+    GetCompositionRoot().outages = nullptr;
     GetCompositionRoot().polls = nullptr;
     // After the network, whose last completions may still have stored something.
     ReleaseContentCache();

@@ -81,6 +81,10 @@ public:
     void WarnAboutRecoverableErrors(bool inDetected);
     /// Tells the user what is wrong, if anything is. Main thread; may run windows.
     void ShowWarningsIfNeeded();
+    // For progress windows, which tell of an outage themselves (OutageMinder). Main thread.
+    bool IsNetworkDown() const noexcept { return mWarnAboutErrors; }
+    bool SignOutFromOutage();
+    void OnProgressWindowsGone();
 
     struct FilledTables {
         bool root = false;

@@ -2,12 +2,14 @@
 // give up.
 #include "Connection/DataServer.h"
 #include "Connection/NetworkUnavailableDialog.h"
+#include "Frame/ProgressWindow.h"
 #include "Frame/Station.h"
 #include "HLM/HLM.h"
 #include "ostcore/debug/Trace.h"
 #include "ostcore/threads/MainThread.h"
 #include "ostcore/utility/StringConversion.h"
 #include "ostui/BackEnd.h"
+#include "OutageMinder.h"
 #include "ZOClient/Messages.h"
 
 namespace ZOCL {
@@ -26,7 +28,34 @@ void TellNetworkState(bool inIsDown) {
     PostLibraryMessage(message);
 }
 
+class LoggedInServerOutage final : public OutageMinder {
+public:
+    bool IsNetworkDown() override {
+        const auto server = Find();
+        return server && server->IsNetworkDown();
+    }
+    bool SignOut() override {
+        const auto server = Find();
+        return server && server->SignOutFromOutage();
+    }
+    void OnProgressWindowsGone() override {
+        if (const auto server = Find()) {
+            server->OnProgressWindowsGone();
+        }
+    }
+
+private:
+    static InterfaceRef<DataServer> Find() {
+        return RFL::QueryInterface<DataServer>(IZOCDataServer::GetLoggedInServerRef());
+    }
+};
+
 }  // namespace
+
+OutageMinder* GetOutageMinder() {
+    static LoggedInServerOutage outage;
+    return &outage;
+}
 
 void DataServer::WarnAboutRecoverableErrors(bool inDetected) {
     if (inDetected) {
@@ -77,7 +106,26 @@ void DataServer::CloseNetworkWarning() {
 }
 
 void DataServer::QueueShowWarnings() {
-    RFL::AsyncCallFromMainThread([self = InterfaceRef<DataServer>(this)] { self->ShowWarningsIfNeeded(); });
+    RFL::AsyncCallFromMainThread([self = InterfaceRef<DataServer>(this)] {
+        // A progress window tells of the outage, and can be pressed, as long as nothing blocks below it.
+        if (!self->mWarnAboutErrors || !IsProgressWindowShown()) {
+            self->ShowWarningsIfNeeded();
+        }
+    });
+}
+
+void DataServer::OnProgressWindowsGone() {
+    if (mWarnAboutErrors && !HLM::GetIsHeadless()) {
+        QueueShowWarnings();
+    }
+}
+
+bool DataServer::SignOutFromOutage() {
+    if (!mWarnAboutErrors.exchange(false)) {
+        return false;
+    }
+    SignOutFromWarning();
+    return true;
 }
 
 void DataServer::ShowWarningsIfNeeded() {

@@ -1,7 +1,5 @@
-// Layout and end of the network warning.
+// What the network warning says, and its end.
 #include "Connection/NetworkUnavailableDialog.h"
-
-#include "ostcore/config/ZString.h"
 
 namespace ZOCL {
 
@@ -14,18 +12,21 @@ const char kMessage[] =
     "current Meridane server.";
 const char kSignOut[] = "$$$/ZOCL/NetworkWarnDialogCancelMsg=Sign Out";
 
-U8String Text(const char* inKey) {
-    return ostcore::ZString(inKey).AsUTF8();
-}
-
 }  // namespace
 
 ZONetworkUnavailableDialog::ZONetworkUnavailableDialog()
-    : mDialog(kNetworkUnavailableDialogID, Text(kTitle)), mWait(new WaitForNetworkRecoveryOperation) {
+    : mWindow(kNetworkUnavailableDialogID),
+      mDialog(mWindow.GetDialog()),
+      mWait(new WaitForNetworkRecoveryOperation) {
     mDialog.SetClosesByItself();
-    mDialog.AddStaticText(kNetworkUnavailableMessage, Text(kMessage));
+    mDialog.SetTitle(UserText(kTitle));
+    mDialog.SetText(kNetworkUnavailableMessage, UserText(kMessage));
+    // Nobody knows how long it takes.
+    mDialog.SetProgress("progressBar", 0, 0);
+    mDialog.SetVisible("confirmButton", false);
+    mDialog.SetText(kNetworkUnavailableSignOut, UserText(kSignOut));
     // The window goes when the wait has ended, so that it has one end and one result.
-    mDialog.AddButton(kNetworkUnavailableSignOut, Text(kSignOut), [this] {
+    mDialog.SetHandler(kNetworkUnavailableSignOut, [this] {
         mDialog.SetEnabled(kNetworkUnavailableSignOut, false);
         mWait->Abort();
     });

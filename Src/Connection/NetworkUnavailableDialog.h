@@ -3,12 +3,12 @@
 #pragma once
 
 #include "Connection/WaitForNetworkRecoveryOperation.h"
-#include "ostui/Dialog.h"
+#include "Frame/LibraryWindow.h"
 
 namespace ZOCL {
 
 constexpr const char* kNetworkUnavailableDialogID = "ZONetworkUnavailableDialog";
-constexpr const char* kNetworkUnavailableMessage = "messageText";
+constexpr const char* kNetworkUnavailableMessage = "progressStaticText";
 constexpr const char* kNetworkUnavailableSignOut = "cancelButton";
 
 /// Runs once. Threads: the main thread, except CloseAsRecovered.
@@ -26,7 +26,8 @@ public:
     void CloseAsRecovered();
 
 private:
-    ostui::Dialog mDialog;
+    LibraryWindow mWindow;
+    ostui::Dialog& mDialog;
     const InterfaceRef<WaitForNetworkRecoveryOperation> mWait;
 };
 

@@ -1,7 +1,5 @@
-// Layout and answers of the reconnect window.
+// What the reconnect window says, and its answers.
 #include "Connection/ReconnectDialog.h"
-
-#include "ostcore/config/ZString.h"
 
 namespace ZOCL {
 
@@ -14,28 +12,21 @@ const char kMessage[] =
     "Please re-enter the password for the user \"@0\" on the server \"@1\":";
 const char kSignInText[] = "$$$/ZOCL/ReconnectDialog/SignInText=Sign In";
 const char kCancelText[] = "$$$/ZOCL/ReconnectDialog/CancelText=Cancel";
-const char kPasswordLabel[] = "$$$/Cadenzo/ZOCL/ZOLoginDialog/kResZOCLPassword=Password";
-
-U8String Text(const char* inKey) {
-    return ostcore::ZString(inKey).AsUTF8();
-}
 
 }  // namespace
 
 ReconnectDialog::ReconnectDialog(const ImmutableString& inUsername, const ImmutableString& inServer)
-    : mDialog(kReconnectDialogID, Text(kTitle)) {
-    mDialog.AddStaticText("messageText",
-                          ostcore::ZString(kMessage, {inUsername.str(), inServer.str()}).AsUTF8());
-    mDialog.AddPasswordEdit(kReconnectPassword, Text(kPasswordLabel));
+    : mWindow(kReconnectDialogID), mDialog(mWindow.GetDialog()) {
+    mDialog.SetTitle(UserText(kTitle));
+    mDialog.SetText(kReconnectMessage, UserText(kMessage, {inUsername.str(), inServer.str()}));
+    mDialog.SetText(kReconnectSignIn, UserText(kSignInText));
+    mDialog.SetText(kReconnectCancel, UserText(kCancelText));
     // Without a password there is nothing to sign in with; the window stays.
-    mDialog.AddButton(kReconnectSignIn, Text(kSignInText), [this] {
+    mDialog.SetHandler(kReconnectSignIn, [this] {
         if (!mDialog.GetText(kReconnectPassword).empty()) {
             mDialog.Close(ostui::kResponseOK);
         }
     });
-    mDialog.AddButton(kReconnectCancel, Text(kCancelText), ostui::kResponseCancel);
-    mDialog.SetDefaultButton(kReconnectSignIn);
-    mDialog.SetCancelButton(kReconnectCancel);
 }
 
 ReconnectDialog::Answer ReconnectDialog::Run() {

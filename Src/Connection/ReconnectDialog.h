@@ -1,12 +1,12 @@
 // The window that asks for the password again when a session has ended.
 #pragma once
 
-#include "ostui/Dialog.h"
-#include "ZOClient/Types.h"
+#include "Frame/LibraryWindow.h"
 
 namespace ZOCL {
 
 constexpr const char* kReconnectDialogID = "ZOReconnectDialog";
+constexpr const char* kReconnectMessage = "messageText";
 constexpr const char* kReconnectPassword = "passwordTextEdit";
 constexpr const char* kReconnectSignIn = "okButton";
 constexpr const char* kReconnectCancel = "cancelButton";
@@ -28,7 +28,8 @@ public:
     void CloseAsOvertaken();
 
 private:
-    ostui::Dialog mDialog;
+    LibraryWindow mWindow;
+    ostui::Dialog& mDialog;
 };
 
 }  // namespace ZOCL

@@ -31,6 +31,7 @@ constexpr const char* kQuestion =
 
 ProgressWindowSettings MakeSettings(const IZOCTransactionList::Entry& inFirst) {
     ProgressWindowSettings settings;
+    settings.layout = kPendingTransactionWindowID;
     settings.title = ZString(kTitle).AsUTF8();
     settings.caption = ZString(kCaption, {inFirst.owner.str(), inFirst.metadata.machineName.str(),
                                           inFirst.metadata.machineIP.str()})
@@ -82,6 +83,8 @@ int PendingTransactionDialog::Run(const shared_ptr<CompoundAsyncOperation>& inOp
             return wait->GetResult();
         case ProgressEnd::kCancelled:
             return kResultDialogCancelled;
+        case ProgressEnd::kForceAborted:
+            return wait->GetForceAbortResult();
         case ProgressEnd::kSecondButton:
             wait->ForceAbort(kResultDialogAlternativeCancelled);
             Discard(inOperation);

@@ -33,6 +33,7 @@ void ShowSessionConflictMessage(const InterfaceRef<IZOCDataServer>& inServer, co
     const ImmutableString& machine = inMetadata.metadata.machineName;
     ostui::MessageBoxSettings box;
     box.title = ZString(kTitle).AsUTF8();
+    box.defaultButton = ostui::kMessageBoxOK;
     box.message =
         application.empty() || machine.empty()
             ? ZString(kWithoutMetadata, {operation, user, extra}).AsUTF8()

@@ -22,7 +22,9 @@ bool AuthorizationProcessor::MakeRequest(const Guid& inRequestID, PackedRequest 
     {
         ScopedLock lock(mMutex, "AuthorizationProcessor::MakeRequest");
         token = mToken;
-        mRequests.emplace(inRequestID, false);
+        if (!mRequests.emplace(inRequestID, false).second) {
+            return false;  // the ID is in use, if only by a request that waits for a token
+        }
     }
     if (!SendWithToken(Request{std::move(inPacked), inCompletion, inRequestID}, token)) {
         Forget(inRequestID);
@@ -160,7 +162,11 @@ void AuthorizationProcessor::SendAgain(const ParkedRequest& inParked, const Immu
     if (IsCancelled(requestID)) {
         EndCancelled(inParked.request);
     } else if (!SendWithToken(inParked.request, inToken)) {
-        EndWithRefusal(inParked);
+        if (IsCancelled(requestID)) {
+            EndCancelled(inParked.request);
+        } else {
+            EndWithRefusal(inParked);
+        }
     } else if (IsCancelled(requestID)) {
         Next()->TryToCancelRequest(requestID);
     }

@@ -23,7 +23,8 @@ namespace ZOCL {
 /// A cancel can come when a refusal is on its way up from the next layer, or the request on its way down to
 /// it, so that nobody below knows the request. So each request stands in mRequests from its start to its end,
 /// and a cancel leaves its mark there: a refusal of a marked request ends it, and what was sent again is
-/// cancelled below once its start has returned.
+/// cancelled below once its start has returned. An ID that is in use is refused: a cancel could reach only
+/// one of the two.
 ///
 /// Invariants: a request is in the hands of the next layer, parked, or taken out to be sent again, and in one
 /// of these only, so it completes once. The mutex is never held over the next layer, a completion or the

@@ -136,7 +136,9 @@ bool RecoverableErrorProcessor::MakeRequest(const Guid& inRequestID, PackedReque
     request->completion = inCompletion;
     {
         ScopedLock lock(mMutex, "RecoverableErrorProcessor::MakeRequest");
-        mRequests.emplace(inRequestID, request);
+        if (!mRequests.emplace(inRequestID, request).second) {
+            return false;  // the ID is in use, if only by a request that waits for its retry
+        }
     }
     if (Send(request)) {
         return true;
@@ -164,8 +166,10 @@ void RecoverableErrorProcessor::OnCompleted(const shared_ptr<Request>& inRequest
     const bool isRepetition = inRequest->retriesLeft != kRetries;
     inRequest->response = isRepetition ? MarkAsRepetition(inResponse) : inResponse;
     if (!IsRecoverableError(inResponse)) {
-        End(inRequest);
         ReportSuccess();
+        Forget(*inRequest);
+        // On a worker already, so that it needs no other one: that would cost more than all of this layer.
+        Complete(*inRequest);
         return;
     }
     if (ReportError(inRequest->retriesLeft)) {
@@ -197,9 +201,13 @@ void RecoverableErrorProcessor::WaitAndRetry(const shared_ptr<Request>& inReques
 }
 
 void RecoverableErrorProcessor::Retry(const shared_ptr<Request>& inRequest) {
-    if (TakeWaiting(*inRequest) && !Send(inRequest)) {
-        End(inRequest);
+    if (!TakeWaiting(*inRequest) || Send(inRequest)) {
+        return;
     }
+    if (inRequest->isCancelled) {
+        inRequest->response = boost::make_shared<Response>(Response::kStatusCancelled);
+    }
+    End(inRequest);
 }
 
 bool RecoverableErrorProcessor::TakeWaiting(Request& ioRequest) {
@@ -249,15 +257,17 @@ void RecoverableErrorProcessor::ReportSuccess() {
 
 void RecoverableErrorProcessor::End(const shared_ptr<Request>& inRequest) {
     Forget(*inRequest);
-    const auto complete = [inRequest] {
-        CompletionFunction completion;
-        completion.swap(inRequest->completion);
-        const shared_ptr<Response> response = std::move(inRequest->response);
-        completion(inRequest->requestID, response);
-    };
+    const auto complete = [inRequest] { Complete(*inRequest); };
     if (!PostFunction(complete, 0)) {
         complete();
     }
+}
+
+void RecoverableErrorProcessor::Complete(Request& ioRequest) {
+    CompletionFunction completion;
+    completion.swap(ioRequest.completion);
+    const shared_ptr<Response> response = std::move(ioRequest.response);
+    completion(ioRequest.requestID, response);
 }
 
 void RecoverableErrorProcessor::Forget(const Request& inRequest) {

@@ -86,7 +86,9 @@ private:
     /// Whether the request gives up; raises its retries when it must not.
     bool ReportError(std::int32_t& ioRetriesLeft);
     void ReportSuccess();
+    /// Completes the request on another worker.
     void End(const shared_ptr<Request>& inRequest);
+    static void Complete(Request& ioRequest);
     void Forget(const Request& inRequest);
 
     const shared_ptr<NetworkState> mState;

@@ -2,11 +2,15 @@
 // thread sees while it is blocked. The reports come from the test, but for the cases of whole outages.
 #include <atomic>
 
+#include "Connection/WaitForNetworkRecoveryOperation.h"
 #include "ConnectSupport.h"
+#include "Frame/ProgressWindow.h"
 #include "Frame/Station.h"
 #include "ostcore/threads/Executor.h"
 #include "ostcore/threads/Scheduler.h"
 #include "ostcore/utility/StringConversion.h"
+#include "OutageMinder.h"
+#include "ResourceFactory.h"
 #include "ZOClient/Library.h"
 #include "ZOClient/Messages.h"
 #include "ZOClientTesting/ScriptedWindows.h"
@@ -111,7 +115,7 @@ private:
 TEST_F(NetworkRecovery, TheWarningClosesByItselfAndComesAgain) {
     for (int outage = 1; outage <= 2; ++outage) {
         windows.Answer(kWarning, [this](ScriptedWindow& ioWindow) {
-            EXPECT_EQ(ioWindow.Text("messageText"),
+            EXPECT_EQ(ioWindow.Text("progressStaticText"),
                       "Communication with the Meridane Collaboration Hub was interrupted due to network "
                       "issues. Please wait for the connection to re-establish or press \"Sign Out\" to sign "
                       "out of the current Meridane server.");
@@ -182,6 +186,33 @@ TEST_F(NetworkRecovery, TwoFailuresInARowShowNothing) {
     EXPECT_EQ(succeeded, 1);
     EXPECT_THAT(windows.Shown(), IsEmpty());
     EXPECT_THAT(states, IsEmpty());
+}
+
+TEST_F(NetworkRecovery, AProgressWindowStandsInForTheWarningAsLongAsItIsOpen) {
+    GetCompositionRoot().outages = GetOutageMinder();
+    for (const bool isSignOut : {false, true}) {
+        const InterfaceRef<WaitForNetworkRecoveryOperation> work(new WaitForNetworkRecoveryOperation);
+        windows.Answer(kProgressWindowID, [&](ScriptedWindow& ioWindow) {
+            const std::size_t shown = windows.Shown().size();
+            Report(true);
+            ioWindow.WaitUntil([&] { return ioWindow.Text(kProgressCancelButton) == "Sign Out"; });
+            ioWindow.WaitUntil([] { return ostcore::threads::MainThreadQueueSize() == 0; });
+            EXPECT_EQ(windows.Shown().size(), shown) << "the user was told twice";
+            isSignOut ? ioWindow.Press(kProgressCancelButton) : work->NetworkIsBack();
+        });
+        if (!isSignOut) {
+            windows.Answer(kWarning, [this](ScriptedWindow& ioWindow) {
+                Report(false);
+                ioWindow.WaitUntil([&] { return ioWindow.IsClosed(); });
+            });
+        }
+        RunProgressWindow(work, {});
+        Pump();
+        EXPECT_EQ(work->GetResult(), isSignOut ? kResultCancelled : kResultSuccess);
+        EXPECT_EQ(terminated, isSignOut ? 1 : 0);
+        EXPECT_NE(RetriesAreEnabled(), isSignOut);
+    }
+    GetCompositionRoot().outages = nullptr;
 }
 
 TEST_F(NetworkRecovery, ALogoutClosesTheWarning) {

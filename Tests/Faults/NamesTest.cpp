@@ -1,4 +1,6 @@
 // Identifiers from a hub that would reach other keys of the registry, or other places of the hub.
+#include <algorithm>
+
 #include "Client.h"
 #include "ZOClient/Registry.h"
 
@@ -46,6 +48,11 @@ TEST_F(HostileNames, OfMediaLocatorsReachNoOtherKey) {
         }
         std::vector<ZOCL::Registry::RecentServer> servers;
         ASSERT_TRUE(ZOCL::Registry::GetRecentServers(servers));
+        // The login remembers its own server, now or a moment ago.
+        const auto ours = std::remove_if(servers.begin(), servers.end(), [&](const auto& inServer) {
+            return inServer.server.find(u"127.0.0.1") != ostcore::UString::npos;
+        });
+        servers.erase(ours, servers.end());
         ASSERT_EQ(servers.size(), 1u) << name;
         EXPECT_EQ(servers[0].server, u"the-one.example") << name;
         ostcore::UString value;

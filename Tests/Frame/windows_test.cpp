@@ -1,7 +1,5 @@
 // Dialogs as their logic sees them: answered by a script, closed from elsewhere, or with nobody to ask; and
 // the progress window around an operation.
-#include <poll.h>
-#include <pty.h>
 #include <unistd.h>
 
 #include <thread>
@@ -173,13 +171,14 @@ TEST_F(WindowsTest, CancelAbortsOnceAndWaitsForTheEnd) {
 
 TEST_F(WindowsTest, TheSecondButtonAsksAndClosesOnlyWhenItMay) {
     ScriptedWindows windows;
+    settings.layout = kPendingTransactionWindowID;
     settings.secondText = "Discard";
     settings.onSecond = [] {
         ostui::MessageBoxSettings question;
         question.buttons = ostui::kMessageBoxYes | ostui::kMessageBoxNo;
         return ostui::RunMessageBox(question) == ostui::kMessageBoxYes;
     };
-    windows.Answer(kProgressWindowID, [](ScriptedWindow& ioWindow) {
+    windows.Answer(kPendingTransactionWindowID, [](ScriptedWindow& ioWindow) {
         ioWindow.Press(kProgressSecondButton);
         EXPECT_FALSE(ioWindow.IsClosed());
         ioWindow.Press(kProgressSecondButton);
@@ -191,86 +190,6 @@ TEST_F(WindowsTest, TheSecondButtonAsksAndClosesOnlyWhenItMay) {
     EXPECT_EQ(operation->aborts, 0);
     EXPECT_THAT(windows.Mismatches(), IsEmpty());
     EXPECT_EQ(windows.Shown().size(), 3u);
-}
-
-/// A terminal whose user the test plays.
-class Terminal {
-public:
-    Terminal() { EXPECT_EQ(openpty(&mUser, &mProgram, nullptr, nullptr, nullptr), 0); }
-    ~Terminal() {
-        if (mUser >= 0) {
-            close(mUser);
-        }
-        close(mProgram);
-    }
-    Terminal(const Terminal&) = delete;
-    Terminal& operator=(const Terminal&) = delete;
-
-    int Program() const { return mProgram; }
-    void Type(const std::string& inText) {
-        if (mUser >= 0) {
-            EXPECT_EQ(write(mUser, inText.data(), inText.size()), static_cast<ssize_t>(inText.size()));
-        }
-    }
-    /// Reads until the text has appeared; all that was shown since the last call. A text that
-    /// does not come hangs up, so that the program sees the end of its input.
-    std::string WaitFor(const std::string& inText) {
-        std::string shown;
-        char character = 0;
-        while (mUser >= 0 && shown.find(inText) == std::string::npos) {
-            pollfd watched{mUser, POLLIN, 0};
-            if (poll(&watched, 1, kPatienceMilliseconds) != 1 || read(mUser, &character, 1) != 1) {
-                ADD_FAILURE() << "waited for \"" << inText << "\" and saw \"" << shown << "\"";
-                close(mUser);
-                mUser = -1;
-                return shown;
-            }
-            shown += character;
-        }
-        return shown;
-    }
-
-private:
-    static constexpr int kPatienceMilliseconds = 60000;
-    int mUser = -1;
-    int mProgram = -1;
-};
-
-TEST_F(WindowsTest, ATerminalAsksLineByLineAndShowsNoPassword) {
-    Terminal terminal;
-    const auto former =
-        ostui::SetBackEnd(ostui::CreateTerminalBackEnd({terminal.Program(), terminal.Program(), {}}));
-    ostui::Dialog dialog("Sign", "");
-    dialog.AddStaticText("text", "Who are \x1b[31myou?");
-    dialog.AddTextEdit("user", "User", "anna");
-    dialog.AddPasswordEdit("password", "Password");
-    dialog.AddButton("ok", "Sign In", ostui::kResponseOK);
-    dialog.AddButton("cancel", "Cancel", ostui::kResponseCancel);
-    std::string shown;
-    std::thread user([&] {
-        shown = terminal.WaitFor("User [anna]: ");
-        terminal.Type("\n");
-        shown += terminal.WaitFor("Password: ");
-        terminal.Type("hidden\n");
-        shown += terminal.WaitFor("> ");
-        terminal.Type("1\n");
-    });
-    EXPECT_EQ(dialog.RunModal(), ostui::kResponseOK);
-    user.join();
-    EXPECT_EQ(dialog.GetText("user"), "anna");
-    EXPECT_EQ(dialog.GetText("password"), "hidden");
-    EXPECT_EQ(shown.find("hidden"), std::string::npos) << shown;
-    EXPECT_EQ(shown.find('\x1b'), std::string::npos) << "what a server says steered the terminal";
-
-    // A window that waits takes a button while the operation runs.
-    settings.caption = "Working";
-    std::thread impatient([&] {
-        terminal.WaitFor("> ");
-        terminal.Type("cancel\n");
-    });
-    EXPECT_EQ(RunProgressWindow(operation, settings), ProgressEnd::kCancelled);
-    impatient.join();
-    ostui::SetBackEnd(former);
 }
 
 TEST_F(WindowsTest, OffATerminalNothingIsAskedAndAnInterruptDismisses) {

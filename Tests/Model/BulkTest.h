@@ -131,8 +131,8 @@ protected:
         On("GET /A2/enclosures", JSONAnswer("{'enclosures':[" + EnclosureItem("E2", "notes") + "]}"));
         On("GET /A2/renditions", JSONAnswer("{'renditions':[]}"));
         On("GET /t1/enclosures", JSONAnswer("{'enclosures':[" + EnclosureItem("EP", "there_xmp") + "]}"));
-        On("POST /t1/bulk/create", [this](const RecordedRequest& inRequest) { return Answer(inRequest); });
-        On("PUT /t1/bulk/edit", [this](const RecordedRequest& inRequest) { return Answer(inRequest); });
+        On("POST /t1/bulk/create", [](const RecordedRequest& inRequest) { return Answer(inRequest); });
+        On("PUT /t1/bulk/edit", [](const RecordedRequest& inRequest) { return Answer(inRequest); });
         On("POST /t1/bulk/delete", JSONAnswer("{}"));
     }
 

@@ -76,7 +76,7 @@ TEST_F(TransactionTest, OpensAtTheLoadedCommitThroughAFactoryThatIsLoadedOnce) {
           "Transaction List Resource successfully loaded with URL ", "Start creating transaction body for N",
           "Finished creating transaction body for N", "Start creating transaction resource N",
           "Transaction resource creation successfully started for N", "Load Transaction resource "}) {
-        EXPECT_TRUE(Traced(text)) << text;
+        EXPECT_TRUE(TracedInTime(text)) << text;
     }
 }
 
