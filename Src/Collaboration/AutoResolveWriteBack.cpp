@@ -86,6 +86,9 @@ void ZOAutoResolveOperation::MergeItem(AutoMergeItem& ioItem) {
 void ZOAutoResolveOperation::StartWriting() {
     const InterfaceRef<ZOAutoResolveOperation> self(this);
     const Operation operation = MakeOperation([self](int inResult) { self->OnWritesEnded(inResult); });
+    // Once it is on its way the server may have opened the transaction, which then has to be rolled back: a
+    // cancel lets it come to its end.
+    const CompoundAsyncOperation::TryToCancelFunction goOn = [](const Guid&) {};
     operation->Initiate(
         [self](const Guid& inID, const RequestCompletion& inCompletion) {
             const ExtraTransactionMetadata extra{{kMetadata_AnswersConflicts, kMetadata_Yes}};
@@ -94,7 +97,8 @@ void ZOAutoResolveOperation::StartWriting() {
         [self, operation](int inResult, const InterfaceRef<IZOCServerResource>& inTransaction,
                           const shared_ptr<ostnet::Response>&) {
             return self->OnTransactionCreated(operation, inResult, inTransaction);
-        });
+        },
+        goOn);
 }
 
 int ZOAutoResolveOperation::OnTransactionCreated(const Operation& inOperation, int inResult,

@@ -4,6 +4,7 @@
 
 #include <set>
 
+#include "Collaboration/XMPEnclosureBase.h"
 #include "Frame/ProgressWindow.h"
 #include "ostcore/config/ZString.h"
 #include "ostcore/debug/Trace.h"
@@ -79,15 +80,6 @@ void InitiateForgiving(const shared_ptr<CompoundAsyncOperation>& inOperation,
                           kForgiveNotModified);
 }
 
-/// The base of the name of an XMP enclosure, empty for any other name.
-ImmutableString AssetNameOf(const ImmutableString& inEnclosureName) {
-    const ImmutableString suffix = GetXMPEnclosureName(ImmutableString(""));
-    const std::string_view name = inEnclosureName.view();
-    const std::string_view end = suffix.view();
-    const bool isXMP = name.size() > end.size() && name.substr(name.size() - end.size()) == end;
-    return isXMP ? ImmutableString(name.substr(0, name.size() - end.size())) : ImmutableString();
-}
-
 }  // namespace
 
 ZOAutoResolveOperation::ZOAutoResolveOperation(const InterfaceRef<IZOCEditingSession>& inSession,
@@ -117,15 +109,29 @@ void ZOAutoResolveOperation::TraceFailure(const char* inText, const ImmutableStr
 
 void ZOAutoResolveOperation::CountSteps(std::size_t inCount) {
     constexpr std::size_t kParts = 100;
-    std::size_t done = 0;
-    std::size_t all = 0;
     {
         ScopedLock lock(IZOCDataServer::GetLock(), "ZOAutoResolveOperation::CountSteps");
-        done = mStepsDone += inCount;
-        all = mStepsAll;
+        mStepsDone += inCount;
+        if (mIsTellingSteps) {
+            return;
+        }
+        mIsTellingSteps = true;
     }
+    // One thread at a time tells, and goes on while the others count, so that progress never goes back.
     // Thousands of small steps are shown in a hundred larger ones.
-    if (all != 0 && done * kParts / all != (done - inCount) * kParts / all) {
+    while (true) {
+        std::size_t done = 0;
+        std::size_t all = 0;
+        {
+            ScopedLock lock(IZOCDataServer::GetLock(), "ZOAutoResolveOperation::CountSteps");
+            done = mStepsDone;
+            all = mStepsAll;
+            if (all == 0 || done * kParts / all == mStepsTold * kParts / all) {
+                mIsTellingSteps = false;
+                return;
+            }
+            mStepsTold = done;
+        }
         RFL::StationUtils::PostMessageToUIThread(
             GetStationID(),
             RFL::UpdateOperationProgressMessage(static_cast<double>(done), static_cast<double>(all)), false);
@@ -245,7 +251,8 @@ int ZOAutoResolveOperation::OnDifferencesAndEnclosuresLoaded(const Operation& in
 
 void ZOAutoResolveOperation::MakeItems() {
     for (const IZOCDifferences::Entry& entry : mOutgoingChanges->GetEnclosureDifferences()) {
-        const ImmutableString assetName = entry.IsInConflict() ? AssetNameOf(entry.name) : ImmutableString();
+        const ImmutableString assetName =
+            entry.IsInConflict() ? GetXMPEnclosureBase(entry.name) : ImmutableString();
         if (assetName.empty()) {
             continue;
         }

@@ -133,6 +133,8 @@ private:
     bool mConflictsRemain ZO_GUARDED_BY(IZOCDataServer::GetLock()) = true;
     std::size_t mStepsDone ZO_GUARDED_BY(IZOCDataServer::GetLock()) = 0;
     std::size_t mStepsAll ZO_GUARDED_BY(IZOCDataServer::GetLock()) = 0;
+    std::size_t mStepsTold ZO_GUARDED_BY(IZOCDataServer::GetLock()) = 0;
+    bool mIsTellingSteps ZO_GUARDED_BY(IZOCDataServer::GetLock()) = false;
 };
 
 }  // namespace ZOCL

@@ -2,8 +2,7 @@
 #include "Operations/PrepareOperationBase.h"
 
 #include <algorithm>
-
-#include "ZOClient/IZOCDataServer.h"
+#include <utility>
 
 namespace ZOCL {
 
@@ -34,17 +33,34 @@ void ZOPrepareOperationBase::Abort() {
         ScopedLock lock(mRequestLock, "ZOPrepareOperationBase::Abort");
         pending = mPendingRequests;
     }
-    const InterfaceRef<IZOCDataServer> server = IZOCDataServer::GetLoggedInServerRef();
-    if (!server) {
-        return;
-    }
     for (const Guid& request : pending) {
-        server->TryToCancelRequest(request);
+        TryToCancel(request);
+    }
+}
+
+void ZOPrepareOperationBase::TryToCancel(const Guid& inRequestID) {
+    InterfaceRef<IZOCDataServer> server;
+    {
+        ScopedLock lock(mRequestLock, "ZOPrepareOperationBase::TryToCancel");
+        server = mServer;
+    }
+    if (server) {
+        server->TryToCancelRequest(inRequestID);
+    }
+}
+
+void ZOPrepareOperationBase::OnRequestStarted(const Guid& inRequestID) {
+    if (IsCanceled()) {
+        TryToCancel(inRequestID);
     }
 }
 
 void ZOPrepareOperationBase::AddPendingRequest(const Guid& inRequestID) {
+    InterfaceRef<IZOCDataServer> server = IZOCDataServer::GetLoggedInServerRef();
     ScopedLock lock(mRequestLock, "ZOPrepareOperationBase::AddPendingRequest");
+    if (!mServer) {
+        std::swap(mServer, server);
+    }
     mPendingRequests.push_back(inRequestID);
 }
 

@@ -5,6 +5,7 @@
 
 #include "ostcore/threads/Executor.h"
 #include "ostcore/threads/RecursiveMutex.h"
+#include "ZOClient/IZOCDataServer.h"
 #include "ZOClient/ZOOperationBase.h"
 
 namespace ZOCL {
@@ -30,14 +31,20 @@ protected:
     ~ZOPrepareOperationBase() override;
 
     void AddPendingRequest(const Guid& inRequestID);
+    /// To be told of each start that succeeded: a cancel that came while it was under way found nothing.
+    void OnRequestStarted(const Guid& inRequestID);
     /// Counts a request that has come back, a known one or not; returns how many have.
     unsigned RemovePendingRequest(const Guid& inRequestID);
     /// Ends with the result that is stored.
     void Finish();
 
 private:
+    void TryToCancel(const Guid& inRequestID);
+
     shared_ptr<ostcore::threads::AsyncExecutor> mExecutor;
     ostcore::threads::RecursiveMutex mRequestLock;
+    /// The one that the requests go to, which may be given up while they are out.
+    InterfaceRef<IZOCDataServer> mServer ZO_GUARDED_BY(mRequestLock);
     std::vector<Guid> mPendingRequests ZO_GUARDED_BY(mRequestLock);
     unsigned mCompletedRequests ZO_GUARDED_BY(mRequestLock) = 0;
 };

@@ -1,6 +1,8 @@
 // A data server over the scripted network, with traces and assertions on record.
 #pragma once
 
+#include <algorithm>
+#include <chrono>
 #include <condition_variable>
 #include <mutex>
 #include <string>
@@ -109,6 +111,7 @@ protected:
         mFormerSink = ostcore::debug::SetTraceSink([this](const std::string& inLine) {
             std::lock_guard<std::mutex> lock(mMutex);
             mTraces.push_back(inLine);
+            mTraced.notify_all();
         });
         ostcore::debug::SetTraceLevel("*", ostcore::debug::kTraceLevel_Progress);
         ostcore::debug::ResetAssertionSites();
@@ -134,12 +137,12 @@ protected:
     /// Everything of one test that a line of the trace holds.
     bool Traced(const std::string& inText) const {
         std::lock_guard<std::mutex> lock(mMutex);
-        for (const std::string& line : mTraces) {
-            if (line.find(inText) != std::string::npos) {
-                return true;
-            }
-        }
-        return false;
+        return IsAmongTraces(inText);
+    }
+    /// For what a worker writes after the request that the test has waited for.
+    bool TracedInTime(const std::string& inText) const {
+        std::unique_lock<std::mutex> lock(mMutex);
+        return mTraced.wait_for(lock, std::chrono::seconds(30), [&] { return IsAmongTraces(inText); });
     }
     std::vector<std::string> Assertions() const {
         std::lock_guard<std::mutex> lock(mMutex);
@@ -155,7 +158,14 @@ protected:
     InterfaceRef<IZOCDataServer> server;
 
 private:
+    bool IsAmongTraces(const std::string& inText) const {
+        return std::any_of(mTraces.begin(), mTraces.end(), [&](const std::string& inLine) {
+            return inLine.find(inText) != std::string::npos;
+        });
+    }
+
     mutable std::mutex mMutex;
+    mutable std::condition_variable mTraced;
     std::vector<std::string> mTraces;
     std::vector<std::string> mAssertions;
     ostcore::debug::TraceSink mFormerSink;

@@ -4,6 +4,7 @@
 #include <fcntl.h>
 #include <signal.h>
 #include <stdlib.h>
+#include <sys/prctl.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -18,6 +19,7 @@
 
 namespace ZOCL {
 
+/// The child ends with the thread that calls this, so that a test that is aborted leaves nothing behind.
 inline pid_t Spawn(const std::vector<std::string>& inArguments, int inOutput) {
     std::vector<char*> words;
     for (const std::string& argument : inArguments) {
@@ -26,6 +28,7 @@ inline pid_t Spawn(const std::vector<std::string>& inArguments, int inOutput) {
     words.push_back(nullptr);
     const pid_t child = fork();
     if (child == 0) {
+        prctl(PR_SET_PDEATHSIG, SIGKILL);
         dup2(inOutput, STDOUT_FILENO);
         execv(words[0], words.data());
         _exit(127);

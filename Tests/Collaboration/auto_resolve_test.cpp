@@ -1,12 +1,9 @@
 // The automatic merge of a session's conflicts over the scripted network: what is asked for and how often,
 // and what each failure leaves behind.
 #include "Collaboration/ZOAutoResolveOperation.h"
-#include "Connection/LoggedInServer.h"
 #include "Connection/ServiceDocument.h"
 #include "MergeTest.h"
-#include "ostcore/threads/Executor.h"
-#include "ostcore/threads/MainThread.h"
-#include "SessionTest.h"
+#include "OperationTest.h"
 #include "ZOClient/XMPMerge.h"
 
 namespace ZOCL {
@@ -15,7 +12,7 @@ namespace {
 using testing::UnorderedElementsAre;
 
 /// An enclosure in conflict; the asset is empty for one of the production.
-struct Conflict {
+struct XMPConflict {
     std::string name;
     std::string base;
     std::string asset = {};
@@ -25,17 +22,14 @@ std::string Dated(const std::string& inDate) {
     return PacketText("<xmp:MetadataDate>" + inDate + "</xmp:MetadataDate>");
 }
 
-class AutoResolveTest : public SessionTest {
+class AutoResolveTest : public OperationTest {
 protected:
     AutoResolveTest() {
-        ostcore::threads::ResetMainThread();
-        ostcore::threads::SetMainThread();
         ServiceDocument document;
         document.links.push_back({kRelation_Productions_Production_ByIdAndCommitId, ImmutableString(),
                                   HubURL("/{productionId}/{commitId}"), ImmutableString(),
                                   ImmutableString()});
         RFL::QueryInterface<DataServer>(server)->TakeLinksDocument(document);
-        ExchangeLoggedInServer(server);
         session = MakeSession();
         On("GET /s1", JSONAnswer(SessionBody(), "\"t1\""));
         On("GET /s1/transactions", JSONAnswer(ListBody("")));
@@ -46,9 +40,6 @@ protected:
     ~AutoResolveTest() override {
         session.Reset();
         operation.Reset();
-        Settle();
-        ExchangeLoggedInServer(nullptr);
-        ostcore::threads::ResetMainThread();
     }
 
     static std::string EnclosureJSON(const std::string& inRoot, const std::string& inName) {
@@ -58,11 +49,11 @@ protected:
                HubURL(place).str() + "'}]}";
     }
     /// One state: its lists, and for each enclosure a packet with this date.
-    void ServeState(const std::string& inRoot, const std::vector<Conflict>& inItems,
+    void ServeState(const std::string& inRoot, const std::vector<XMPConflict>& inItems,
                     const std::string& inDate) {
         std::string enclosures;
         std::string assets;
-        for (const Conflict& item : inItems) {
+        for (const XMPConflict& item : inItems) {
             const std::string json = EnclosureJSON(inRoot, item.name);
             if (item.asset.empty()) {
                 enclosures += (enclosures.empty() ? "" : ",") + json;
@@ -80,9 +71,10 @@ protected:
             On("GET " + inRoot, JSONAnswer("{'zo:productionId':'p1','links':[" + Lists(inRoot) + "]}"));
         }
     }
-    static ScriptedAnswer Differences(const std::vector<Conflict>& inItems, const std::string& inMore = "") {
+    static ScriptedAnswer DifferencesOf(const std::vector<XMPConflict>& inItems,
+                                        const std::string& inMore = "") {
         std::string entries = inMore;
-        for (const Conflict& item : inItems) {
+        for (const XMPConflict& item : inItems) {
             entries +=
                 (entries.empty() ? "{'zo:name':'" : ",{'zo:name':'") + item.name +
                 "','zo:differenceType':'UPDATED','zo:conflictsWithContentId':'other','zo:baseCommitId':'" +
@@ -93,7 +85,7 @@ protected:
                           "]}}");
     }
     /// The conflicts of a session that was merged with c9, and what each later question finds.
-    void Serve(const std::vector<Conflict>& inItems, const std::vector<ScriptedAnswer>& inDifferences) {
+    void Serve(const std::vector<XMPConflict>& inItems, const std::vector<ScriptedAnswer>& inDifferences) {
         ServeState("/p1/c9", inItems, "2024-02");
         ServeState("/p1/c1", inItems, "2024-01");
         ServeState("/p1/c2", inItems, "2024-01");
@@ -104,33 +96,11 @@ protected:
             return inDifferences[std::min(asked->fetch_add(1), inDifferences.size() - 1)];
         });
     }
-    void Settle() {
-        for (int round = 0; round < 3; ++round) {
-            EXPECT_TRUE(net->WaitUntilIdle());
-            EXPECT_TRUE(ostcore::threads::WaitForExecutors(20000));
-        }
-        ostcore::threads::PumpMainThread();
+    const InterfaceRef<ZOAutoResolveOperation>& MakeOperation() {
+        return operation = InterfaceRef<ZOAutoResolveOperation>(
+                   new ZOAutoResolveOperation(session, ImmutableString("c5")));
     }
-    void Listen() {
-        operation =
-            InterfaceRef<ZOAutoResolveOperation>(new ZOAutoResolveOperation(session, ImmutableString("c5")));
-        ends = 0;
-        listener.reset(new RFL::Listener(operation->GetStationID()));
-        listener->AddHandler<RFL::OperationCompleteMessage>(
-            [this](const RFL::OperationCompleteMessage&) { ++ends; });
-        listener->AddHandler<RFL::UpdateOperationProgressMessage>(
-            [this](const RFL::UpdateOperationProgressMessage& inMessage) {
-                progress.push_back(inMessage.value / inMessage.range);
-            });
-    }
-    /// Runs it to its end, which comes once.
-    int Run() {
-        Listen();
-        EXPECT_TRUE(operation->Start());
-        Settle();
-        EXPECT_EQ(ends, 1);
-        return operation->GetResult();
-    }
+    int Run() { return OperationTest::Run(MakeOperation()); }
     std::vector<std::string> Written() const {
         std::vector<std::string> paths;
         for (const RecordedRequest& request : net->Requests()) {
@@ -143,9 +113,6 @@ protected:
 
     InterfaceRef<Production> session;
     InterfaceRef<ZOAutoResolveOperation> operation;
-    shared_ptr<RFL::Listener> listener;
-    std::vector<double> progress;
-    int ends = 0;
 };
 
 const char* const kOthers =
@@ -154,12 +121,12 @@ const char* const kOthers =
     "{'zo:name':'quiet_xmp','zo:baseCommitId':'c3'}";
 
 TEST_F(AutoResolveTest, EveryStateIsLoadedOnceAndEverythingIsCommittedAtOnce) {
-    const std::vector<Conflict> items{{"a_xmp", "c1"},
-                                      {"b_xmp", "c1"},
-                                      {"c_xmp", "c2"},
-                                      {"d_xmp", "c2", "asset1"},
-                                      {"d_xmp", "c1", "asset2"}};
-    Serve(items, {Differences(items, kOthers), Differences({}, kOthers)});
+    const std::vector<XMPConflict> items{{"a_xmp", "c1"},
+                                         {"b_xmp", "c1"},
+                                         {"c_xmp", "c2"},
+                                         {"d_xmp", "c2", "asset1"},
+                                         {"d_xmp", "c1", "asset2"}};
+    Serve(items, {DifferencesOf(items, kOthers), DifferencesOf({}, kOthers)});
     EXPECT_EQ(Run(), kResultSuccess);
     EXPECT_TRUE(operation->ConflictsRemain()) << "what is no XMP enclosure is not decided";
     for (const char* path :
@@ -230,11 +197,11 @@ TEST_F(AutoResolveTest, AFailureOfOneStepLeavesItsItemsInConflictAndNoOthers) {
          true},
         {"PUT /t1/x/a_xmp", ScriptedAnswer::Status(500), "OnEnclosureWritten: Failed", false, true},
     };
-    const std::vector<Conflict> items{{"a_xmp", "c1"}, {"b_xmp", "c2"}};
+    const std::vector<XMPConflict> items{{"a_xmp", "c1"}, {"b_xmp", "c2"}};
     for (const Row& row : rows) {
         ReplaceContentCache(QM::CreateDataCacheInMemory());
         session = MakeSession();
-        Serve(items, {Differences(items)});
+        Serve(items, {DifferencesOf(items)});
         On("PUT /t1/x/a_xmp", JSONAnswer(EnclosureJSON("/t1", "a_xmp")));
         On(row.request, row.answer);
         net->ClearRequests();
@@ -253,8 +220,8 @@ TEST_F(AutoResolveTest, AFailureOfOneStepLeavesItsItemsInConflictAndNoOthers) {
 }
 
 TEST_F(AutoResolveTest, AContradictionStaysWhileTheOthersMerge) {
-    const std::vector<Conflict> items{{"a_xmp", "c1"}, {"b_xmp", "c1"}};
-    Serve(items, {Differences(items), Differences({items[0]})});
+    const std::vector<XMPConflict> items{{"a_xmp", "c1"}, {"b_xmp", "c1"}};
+    Serve(items, {DifferencesOf(items), DifferencesOf({items[0]})});
     const auto format = [](const char* inText) {
         return ScriptedAnswer::Body(PacketText(std::string("<dc:format>") + inText + "</dc:format>"),
                                     "application/xml");
@@ -269,8 +236,8 @@ TEST_F(AutoResolveTest, AContradictionStaysWhileTheOthersMerge) {
 }
 
 TEST_F(AutoResolveTest, WhatTheHubStillCallsAConflictIsAccepted) {
-    const std::vector<Conflict> items{{"a_xmp", "c1"}, {"b_xmp", "c1"}, {"c_xmp", "c1"}};
-    Serve(items, {Differences(items), Differences({items[0], items[2]}), Differences({})});
+    const std::vector<XMPConflict> items{{"a_xmp", "c1"}, {"b_xmp", "c1"}, {"c_xmp", "c1"}};
+    Serve(items, {DifferencesOf(items), DifferencesOf({items[0], items[2]}), DifferencesOf({})});
     On("POST /accept/a_xmp", JSONAnswer(SessionBody("c7")));
     On("POST /accept/c_xmp", JSONAnswer(SessionBody("c8")));
     EXPECT_EQ(Run(), kResultSuccess);
@@ -282,18 +249,18 @@ TEST_F(AutoResolveTest, WhatTheHubStillCallsAConflictIsAccepted) {
 }
 
 TEST_F(AutoResolveTest, WithoutAConflictOfMetadataNothingIsAskedForMore) {
-    Serve({}, {Differences({}, kOthers)});
+    Serve({}, {DifferencesOf({}, kOthers)});
     EXPECT_EQ(Run(), kResultSuccess);
     EXPECT_TRUE(operation->ConflictsRemain());
     EXPECT_EQ(Requests(), 3u);
-    Serve({}, {Differences({})});
+    Serve({}, {DifferencesOf({})});
     EXPECT_EQ(Run(), kResultSuccess);
     EXPECT_FALSE(operation->ConflictsRemain());
 
-    const std::vector<Conflict> items{{"a_xmp", "c1"}};
+    const std::vector<XMPConflict> items{{"a_xmp", "c1"}};
     for (const char* request : {"GET /s1", "GET /s1/out", "GET /s1/enclosures"}) {
         session = MakeSession();
-        Serve(items, {Differences(items)});
+        Serve(items, {DifferencesOf(items)});
         On("GET /s1", JSONAnswer(SessionBody(), "\"t1\""));
         On(request, ScriptedAnswer::Status(503));
         net->ClearRequests();
@@ -307,8 +274,8 @@ TEST_F(AutoResolveTest, WithoutAConflictOfMetadataNothingIsAskedForMore) {
 }
 
 TEST_F(AutoResolveTest, ACommitThatIsRefusedLeavesEverythingAndTellsWhoWasThere) {
-    const std::vector<Conflict> items{{"a_xmp", "c1"}};
-    Serve(items, {Differences(items)});
+    const std::vector<XMPConflict> items{{"a_xmp", "c1"}};
+    Serve(items, {DifferencesOf(items)});
     const std::string title =
         "{\\'commitMessage\\':\\'theirs\\',\\'metadata\\':{\\'machineName\\':\\'m2\\'}}";
     On("GET /s1",
@@ -332,16 +299,15 @@ TEST_F(AutoResolveTest, ACommitThatIsRefusedLeavesEverythingAndTellsWhoWasThere)
 }
 
 TEST_F(AutoResolveTest, ACancelStopsTheLoadsAndTakesBackTheWrites) {
-    const std::vector<Conflict> items{{"a_xmp", "c1"}, {"b_xmp", "c1"}};
+    const std::vector<XMPConflict> items{{"a_xmp", "c1"}, {"b_xmp", "c1"}};
     for (const char* held : {"GET /s1", "GET /p1/c1", "GET /p1/c9/x/a_xmp", "PUT /t1/x/b_xmp"}) {
         ReplaceContentCache(QM::CreateDataCacheInMemory());
         session = MakeSession();
-        Serve(items, {Differences(items)});
+        Serve(items, {DifferencesOf(items)});
         On("GET /s1", JSONAnswer(SessionBody(), "\"t1\""));
         On(held, ScriptedAnswer::Hold());
         net->ClearRequests();
-        Listen();
-        ASSERT_TRUE(operation->Start());
+        Start(MakeOperation());
         Settle();
         EXPECT_EQ(ends, 0) << held;
         operation->Abort();
@@ -352,14 +318,13 @@ TEST_F(AutoResolveTest, ACancelStopsTheLoadsAndTakesBackTheWrites) {
         EXPECT_EQ(CountOf("POST", "/t1/commit"), 0u) << held;
         EXPECT_EQ(CountOf("POST", "/t1/rollback"), held[0] == 'P' ? 1u : 0u) << held;
     }
-    Listen();
-    operation->Abort();
+    MakeOperation()->Abort();
     EXPECT_FALSE(operation->Start());
 }
 
 TEST_F(AutoResolveTest, RunsUnderAProgressWindowFromTheURLOfASession) {
-    const std::vector<Conflict> items{{"a_xmp", "c1"}};
-    Serve(items, {Differences(items), Differences({})});
+    const std::vector<XMPConflict> items{{"a_xmp", "c1"}};
+    Serve(items, {DifferencesOf(items), DifferencesOf({})});
     EXPECT_FALSE(AutoResolveXMPConflicts(HubURL("/s1"), ImmutableString("c5")));
     EXPECT_EQ(CountOf("POST", "/t1/commit"), 1u);
     net->ClearRequests();

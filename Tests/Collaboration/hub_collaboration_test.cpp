@@ -1,71 +1,30 @@
 // History, differences and the sandbox of a real session, over sockets.
 #include <atomic>
-#include <future>
 
-#include "HubProcess.h"
-#include "ostcore/threads/MainThread.h"
-#include "RFL/Registry.h"
+#include "Connection/LoggedInServer.h"
+#include "HubSessionTest.h"
 #include "ZOClient/CommitMetadata.h"
 #include "ZOClient/IZOCDifferences.h"
-#include "ZOClient/IZOCEditingSession.h"
 #include "ZOClient/IZOCProductionHistory.h"
-#include "ZOClient/Library.h"
 #include "ZOClient/ZOSandbox.h"
 
 namespace ZOCL {
 namespace {
 
-struct Ended {
-    int result = kResultNotStarted;
-    InterfaceRef<IZOCServerResource> resource;
-};
-
-/// Starts a request and waits for its end.
-Ended WaitFor(const function<bool(const Guid&, const RequestCompletion&)>& inStart) {
-    const auto ended = boost::make_shared<std::promise<Ended>>();
-    const bool started =
-        inStart(Guid::CreateUnique(),
-                [ended](const Guid&, int inResult, const InterfaceRef<IZOCServerResource>& inResource,
-                        const shared_ptr<ostnet::Response>&) {
-                    ended->set_value({inResult, inResource});
-                });
-    EXPECT_TRUE(started);
-    return started ? ended->get_future().get() : Ended();
-}
-
 template <class T>
 InterfaceRef<T> Loaded(const InterfaceRef<T>& inObject) {
-    const auto resource = RFL::QueryInterface<IZOCServerResource>(inObject);
+    const auto resource = As<IZOCServerResource>(inObject);
     EXPECT_TRUE(resource && resource->Load(true));
     return inObject;
 }
 
-class HubCollaborationTest : public testing::Test {
+class HubCollaborationTest : public HubSessionTest {
 protected:
-    HubCollaborationTest() {
-        setenv("ZOCLIENT_CONFIG_HOME", (hub.Directory() + "/config").c_str(), 1);
-        setenv("ZOCLIENT_STATE_HOME", (hub.Directory() + "/state").c_str(), 1);
-        RFL::CloseRegistry();
-        Initialize();
-        ZOSCredentials credentials;
-        credentials.username = ImmutableString("anna");
-        credentials.password = "annas-secret";
-        std::promise<InterfaceRef<IZOCDataServer>> ended;
-        Guid id;
-        EXPECT_TRUE(IZOCDataServer::ConnectToServer(
-            hub.URL(), credentials, id, false,
-            [&ended](const Guid&, const InterfaceRef<IZOCDataServer>& inServer, int,
-                     const shared_ptr<ostnet::Response>&) { ended.set_value(inServer); },
-            true, true));
-        server = ended.get_future().get();
-    }
+    HubCollaborationTest() : server(Connect(hub.URL().str(), "anna")) { ExchangeLoggedInServer(server); }
     ~HubCollaborationTest() override {
         SetCurrentZOSandbox(nullptr);
         server.Reset();
         IZOCDataServer::Terminate(false);
-        ostcore::threads::PumpMainThread();
-        Shutdown();
-        RFL::CloseRegistry();
     }
 
     InterfaceRef<IZOCEditingSession> OpenSession(const InterfaceRef<IZOCProduction>& inProduction,
@@ -74,54 +33,16 @@ protected:
         EXPECT_TRUE(inProduction->CreateEditingSession(session, u"work", u"", inIsTemporary));
         return session;
     }
-    using Write = function<bool(const InterfaceRef<IZOCTransaction>&, const Guid&, const RequestCompletion&)>;
-    /// One request in a transaction of its own.
-    void WriteAndCommit(const InterfaceRef<IZOCEditingSession>& inSession, const UString& inMessage,
-                        const Write& inWrite) {
-        const Ended opened = WaitFor([&](const Guid& inID, const RequestCompletion& inEnd) {
-            return inSession->CreateTransaction(inID, inEnd, kTransactionType_Edit);
-        });
-        const auto transaction = RFL::QueryInterface<IZOCTransaction>(opened.resource);
-        ASSERT_TRUE(transaction) << GetResultName(opened.result);
-        EXPECT_GE(WaitFor([&](const Guid& inID, const RequestCompletion& inEnd) {
-                      return inWrite(transaction, inID, inEnd);
-                  }).result,
-                  0);
-        EXPECT_EQ(WaitFor([&](const Guid& inID, const RequestCompletion& inEnd) {
-                      return transaction->Commit(inID, inEnd, inMessage);
-                  }).result,
-                  kResultSuccess);
+    static void AddAsset(const InterfaceRef<IZOCEditingSession>& inSession, const UString& inName,
+                         const UString& inMessage) {
+        const auto transaction = OpenTransaction(inSession);
+        Add(transaction, inName);
+        EXPECT_EQ(Commit(transaction, inMessage), kResultSuccess);
     }
-    void AddAsset(const InterfaceRef<IZOCEditingSession>& inSession, const UString& inName,
-                  const UString& inMessage) {
-        AssetBaseProperties properties;
-        properties.name = inName;
-        properties.assetType = kAssetType_Bin;
-        WriteAndCommit(inSession, inMessage,
-                       [properties](const InterfaceRef<IZOCTransaction>& inTransaction, const Guid& inID,
-                                    const RequestCompletion& inEnd) {
-                           return inTransaction->CreateNewAsset(inID, inEnd, properties);
-                       });
-    }
-    void WriteNotes(const InterfaceRef<IZOCEditingSession>& inSession, const std::string& inText) {
-        WriteAndCommit(inSession, u"Notes",
-                       [inText](const InterfaceRef<IZOCTransaction>& inTransaction, const Guid& inID,
-                                const RequestCompletion& inEnd) {
-                           return inTransaction->WriteEnclosure("notes.txt", inText, inID, inEnd,
-                                                                "text/plain");
-                       });
-    }
-    int GetLatest(const InterfaceRef<IZOCEditingSession>& inSession, MergeStrategy inStrategy) {
-        return WaitFor([&](const Guid& inID, const RequestCompletion& inEnd) {
-                   return inSession->Pull(inID, inEnd, inStrategy, u"");
-               })
-            .result;
-    }
-    int Share(const InterfaceRef<IZOCEditingSession>& inSession, const UString& inMessage) {
-        return WaitFor([&](const Guid& inID, const RequestCompletion& inEnd) {
-                   return inSession->Push(inID, inEnd, inMessage, kResolveStrategy_None, u"");
-               })
-            .result;
+    static void WriteNotes(const InterfaceRef<IZOCEditingSession>& inSession, const std::string& inText) {
+        const auto transaction = OpenTransaction(inSession);
+        EXPECT_EQ(Write(transaction, "notes.txt", inText), kResultSuccess);
+        EXPECT_EQ(Commit(transaction), kResultSuccess);
     }
     static shared_ptr<ZOSandbox> OpenSandbox(const InterfaceRef<IZOCEditingSession>& inSession) {
         return boost::make_shared<ZOSandbox>(
@@ -155,7 +76,6 @@ protected:
         return ended.get_future().get();
     }
 
-    RunningHub hub;
     InterfaceRef<IZOCDataServer> server;
 };
 
@@ -192,15 +112,15 @@ TEST_F(HubCollaborationTest, HistoryDifferencesAndSandboxFollowTheWork) {
     const auto other = OpenSession(production, true);
     ASSERT_TRUE(other);
     AddAsset(other, u"Sound", u"Second bin");
-    EXPECT_EQ(Share(other, u"Sound is there"), kResultSuccess);
+    EXPECT_EQ(Push(other, u"Sound is there"), kResultSuccess);
     EXPECT_EQ(UpdatedState(*sandbox), "-D-");
     const auto incoming = Loaded(session->GetIncomingChanges())->GetAssetDifferences();
     ASSERT_EQ(incoming.size(), 1u);
     EXPECT_EQ(incoming[0].name.view(), "Sound");
-    EXPECT_EQ(Share(session, u"too late"), kResultHTTPConflict);
-    EXPECT_EQ(GetLatest(session, kMergeStrategy_Safe), kResultSuccess);
+    EXPECT_EQ(Push(session, u"too late"), kResultHTTPConflict);
+    EXPECT_EQ(Pull(session, kMergeStrategy_Safe), kResultSuccess);
     EXPECT_EQ(UpdatedState(*sandbox), "SD-");
-    EXPECT_EQ(Share(session, u"Dailies are there"), kResultSuccess);
+    EXPECT_EQ(Push(session, u"Dailies are there"), kResultSuccess);
     EXPECT_EQ(UpdatedState(*sandbox), "S--");
 
     const auto history = Loaded(production->GetProductionHistory());
@@ -226,11 +146,11 @@ TEST_F(HubCollaborationTest, AConflictShowsInDifferencesAndSandboxUntilItIsDecid
     ASSERT_TRUE(session && other);
     WriteNotes(session, "mine");
     WriteNotes(other, "theirs");
-    EXPECT_EQ(Share(other, u"Notes first"), kResultSuccess);
+    EXPECT_EQ(Push(other, u"Notes first"), kResultSuccess);
     const auto sandbox = OpenSandbox(session);
-    EXPECT_EQ(GetLatest(session, kMergeStrategy_Safe), kResultHTTPConflict);
+    EXPECT_EQ(Pull(session, kMergeStrategy_Safe), kResultHTTPConflict);
     EXPECT_EQ(UpdatedState(*sandbox), "-D-");
-    EXPECT_EQ(GetLatest(session, kMergeStrategy_Interactive), kResultSuccess);
+    EXPECT_EQ(Pull(session, kMergeStrategy_Interactive), kResultSuccess);
     EXPECT_EQ(UpdatedState(*sandbox), "SDC");
     const auto outgoing = Loaded(session->GetOutgoingChanges());
     EXPECT_TRUE(outgoing->HasEnclosureConflicts());
@@ -244,7 +164,7 @@ TEST_F(HubCollaborationTest, AConflictShowsInDifferencesAndSandboxUntilItIsDecid
     EXPECT_FALSE(entries[0].acceptYoursURL.empty());
     ASSERT_FALSE(entries[0].acceptTheirsURL.empty());
     const std::string body = "{\":commitId\":\"" + outgoing->GetCommitID().str() + "\"}";
-    EXPECT_EQ(WaitFor([&](const Guid& inID, const RequestCompletion& inEnd) {
+    EXPECT_EQ(Perform([&](const Guid& inID, const RequestCompletion& inEnd) {
                   return server->PostToURL(entries[0].acceptTheirsURL, RecycledMemory::CreateFromBytes(body),
                                            ImmutableString("application/json;charset=utf-8"), inID, inEnd);
               }).result,

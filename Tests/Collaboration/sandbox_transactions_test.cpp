@@ -28,7 +28,7 @@ protected:
 TEST_F(SandboxTransactionsTest, AUserWhoClosesTheProductionIsHeard) {
     MakeSandbox();
     Answer("/t", ListAnswer("edit", "\"1\""));
-    windows.AnswerWith("ZOProgressDialog", "cancelButton");
+    windows.AnswerWith("ZOPendingTransactionDialog", "cancelButton");
     Check();
     ASSERT_EQ(windows.Shown().size(), 1u);
     EXPECT_EQ(windows.Shown()[0].title, "Waiting For Changes");
@@ -63,7 +63,7 @@ TEST_F(SandboxTransactionsTest, OneCheckAtATime) {
     Check();
     EXPECT_EQ(RequestsFor("/t").size(), 1u);
     // Still running while the user is asked.
-    windows.Answer("ZOProgressDialog", [this](ScriptedWindow& ioWindow) {
+    windows.Answer("ZOPendingTransactionDialog", [this](ScriptedWindow& ioWindow) {
         sandbox->CheckForPendingTransactionConflicts({});
         ioWindow.Press("cancelButton");
     });
@@ -80,7 +80,7 @@ TEST_F(SandboxTransactionsTest, OneCheckAtATime) {
 TEST_F(SandboxTransactionsTest, AWaitThatEndsByItselfClosesNothing) {
     MakeSandbox();
     Answer("/t", ListAnswer("edit", "\"1\""));
-    windows.Answer("ZOProgressDialog", [this](ScriptedWindow& ioWindow) {
+    windows.Answer("ZOPendingTransactionDialog", [this](ScriptedWindow& ioWindow) {
         Answer("/t", JSONAnswer("{'transactions':[]}", "\"2\""));
         ioWindow.WaitUntil([&] { return ioWindow.IsClosed(); });
     });
