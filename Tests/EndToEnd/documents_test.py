@@ -19,7 +19,7 @@ class Documents(EndToEndTest):
         self.assertEqual([verb["name"] for verb in self.table],
                          ["hub", "login", "logout", "whoami", "productions", "open", "show", "assets", "get", "session",
                           "status", "add", "ingest", "set", "put", "rm", "xmp", "commit", "rollback", "pending", "share", "latest",
-                          "conflicts", "resolve", "diff", "history", "watch", "help", "version", "completion", "man"])
+                          "conflicts", "resolve", "diff", "history", "watch", "desk", "help", "version", "completion", "man"])
         overview = self.ends(self.ada.zo("help"), OK).text
         for verb in self.table:
             self.assertIn("\n  " + verb["name"], overview)

@@ -42,14 +42,18 @@ ItemKey KeyOf(const Change& inChange) {
             inChange.kind == ItemKind::Enclosure ? inChange.entry.name.str() : std::string()};
 }
 
-std::vector<Change> LoadChanges(Context& ioContext, const ZOCL::InterfaceRef<IZOCDifferences>& inDifferences,
-                                const std::string& inWhat) {
-    LoadResource(ioContext, inDifferences, inWhat);
+std::vector<Change> ChangesOf(const ZOCL::InterfaceRef<IZOCDifferences>& inDifferences) {
     std::vector<Change> all;
     Append(all, ItemKind::Asset, inDifferences->GetAssetDifferences());
     Append(all, ItemKind::Enclosure, inDifferences->GetEnclosureDifferences());
     Append(all, ItemKind::Properties, inDifferences->GetPropertiesDifferences());
     return all;
+}
+
+std::vector<Change> LoadChanges(Context& ioContext, const ZOCL::InterfaceRef<IZOCDifferences>& inDifferences,
+                                const std::string& inWhat) {
+    LoadResource(ioContext, inDifferences, inWhat);
+    return ChangesOf(inDifferences);
 }
 
 std::vector<Change> LoadOutgoing(Context& ioContext, const WorkSession& inSession) {

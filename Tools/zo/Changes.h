@@ -39,7 +39,9 @@ struct ItemKey {
 };
 ItemKey KeyOf(const Change& inChange);
 
-/// Assets, then enclosures, then the properties of the production.
+/// Of differences that are loaded: assets, then enclosures, then the properties of the production.
+std::vector<Change> ChangesOf(const ZOCL::InterfaceRef<ZOCL::IZOCDifferences>& inDifferences);
+/// The same, loaded here.
 std::vector<Change> LoadChanges(Context& ioContext,
                                 const ZOCL::InterfaceRef<ZOCL::IZOCDifferences>& inDifferences,
                                 const std::string& inWhat);

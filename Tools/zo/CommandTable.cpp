@@ -221,6 +221,20 @@ Command Version() {
             RunVersion};
 }
 
+Command Desk() {
+    return {"desk",
+            "open the desktop window",
+            "Starts zo-desk, the desktop host, with this hub and user and the login of zo: the assets of a "
+            "production as a tree, their metadata to edit, and buttons to share, get the latest and resolve. "
+            "zo-desk must lie beside zo; it is built where Qt 6 is found.",
+            {{"PRODUCTION", "By name or identifier; the open one when it is left out.", false}},
+            {},
+            true,
+            {{"zo desk 'Harbour Film'", "Work on a production."}},
+            {ExitCode::NotFound},
+            RunDesk};
+}
+
 Command Completion() {
     return {"completion",
             "print a completion script for a shell",
@@ -262,7 +276,7 @@ const std::vector<Command>& AllCommands() {
         std::vector<Command> all{Hub(),  Login(), Logout(), WhoAmI(), Productions(),
                                  Open(), Show(),  Assets(), Get()};
         for (const auto& commands :
-             {WorkCommands(), std::vector<Command>{Help(), Version(), Completion(), Man()}}) {
+             {WorkCommands(), std::vector<Command>{Desk(), Help(), Version(), Completion(), Man()}}) {
             all.insert(all.end(), commands.begin(), commands.end());
         }
         return all;
@@ -283,6 +297,7 @@ const std::vector<Option>& CommonOptions() {
     static const std::vector<Option> table{
         {"json", 0, "", "Write one JSON object a line."},
         {"quiet", 'q', "", "Write results and errors only."},
+        {"no-input", 0, "", "Ask nothing, also on a terminal."},
         {"color",
          0,
          "WHEN",

@@ -14,6 +14,8 @@ const Option kForce{"force", 'f', "", "Replace files that exist already."};
 const Option kShared{"shared", 0, "",
                      "Read the shared production at the open commit, also when a session is in use."};
 
+const Option kInteractive{"interactive", 'i', "", "Ask on the way; needs a terminal."};
+
 const std::vector<ExitCode> kOfRequests{ExitCode::NotAuthenticated, ExitCode::NotPermitted,
                                         ExitCode::NotFound, ExitCode::Network, ExitCode::Tls};
 
@@ -233,13 +235,18 @@ Command Pending() {
 Command Share() {
     return {"share",
             "share your session: make it a commit that all see",
-            "Nothing is shared when others have shared something newer (code 4: get it with 'zo latest' "
-            "first), when conflicts remain (code 3), or when the session was changed from elsewhere since "
-            "you saw it last (code 5: 'zo status' shows it).",
+            "On a terminal, without -m, it walks the whole way with you: gets the latest first when others "
+            "have shared something newer, merges what it can, lets you decide what is in conflict, lists "
+            "what is about to be shared, asks for the message, and shares. With -m, --no-input or --dry-run "
+            "and off a terminal it asks nothing. Then nothing is shared when others have shared something "
+            "newer (code 4: get it with 'zo latest' first), or when conflicts remain (code 3). In any case "
+            "nothing is shared when the session was changed from elsewhere since you saw it last (code 5: "
+            "'zo status' shows it), or when you stop on the way (code 3 when conflicts remain, else 130).",
             {},
-            {kMessage, kDryRun},
+            {kMessage, kInteractive, kDryRun},
             true,
-            {{"zo share -m 'First cut'", "Share everything."}},
+            {{"zo share", "On a terminal: all that it takes, step by step."},
+             {"zo share -m 'First cut'", "Share everything, without a question."}},
             AndAlso({ExitCode::ConflictsRemain, ExitCode::Behind, ExitCode::SessionChanged}),
             RunShare};
 }
@@ -250,7 +257,8 @@ Command Latest() {
         "get the latest shared commits into your session",
         "Takes what only others have changed, keeps what only you have changed, merges XMP metadata that "
         "both have changed, and leaves as conflicts what both have changed otherwise (code 3). --dry-run "
-        "lists what would conflict, with who changed it, when and what on each side, and changes nothing.",
+        "lists what would conflict, with who changed it, when and what on each side, and changes nothing. "
+        "With --interactive it goes on to ask, item by item, what is to become of the conflicts.",
         {},
         {{"strategy",
           0,
@@ -259,9 +267,12 @@ Command Latest() {
           "nothing at all when there is any (safe).",
           Completes::Choices,
           {"interactive", "mine", "theirs", "safe"}},
+         kInteractive,
          kDryRun},
         true,
-        {{"zo latest --dry-run", "What would come, and what would conflict."}, {"zo latest", "Get it."}},
+        {{"zo latest --dry-run", "What would come, and what would conflict."},
+         {"zo latest", "Get it."},
+         {"zo latest -i", "Get it, and decide the conflicts on the spot."}},
         AndAlso({ExitCode::ConflictsRemain, ExitCode::SessionChanged}),
         RunLatest};
 }
@@ -285,15 +296,19 @@ Command Resolve() {
         "decide conflicts",
         "Keeps your side, takes theirs, or takes theirs and keeps yours as a new asset beside it. An item "
         "is named by its asset (name or identifier), by its enclosure's name, or 'production' for the "
-        "production's properties.",
+        "production's properties. On a terminal, without items and a decision, it shows them all and asks "
+        "which and how, until none is left or you stop; it keeps no copies then.",
         {{"ITEM", "What to decide.", false, Completes::Nothing, {}, true}},
         {{"mine", 0, "", "Keep my side."},
          {"theirs", 0, "", "Take the shared side."},
          {"copy", 0, "", "Take the shared side and keep mine as a new asset."},
          {"all", 0, "", "Decide all conflicts in this way."},
+         kInteractive,
          kDryRun},
         true,
-        {{"zo resolve --theirs clip01", "One asset."}, {"zo resolve --mine --all", "Everything."}},
+        {{"zo resolve", "On a terminal: one after the other, by their numbers."},
+         {"zo resolve --theirs clip01", "One asset."},
+         {"zo resolve --mine --all", "Everything."}},
         AndAlso({ExitCode::ConflictsRemain, ExitCode::SessionChanged, ExitCode::PartlyDone}),
         RunResolve};
 }

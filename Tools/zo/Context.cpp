@@ -8,6 +8,7 @@
 #include "HLM/HLM.h"
 #include "ostcore/config/ClientInfo.h"
 #include "ostcore/debug/Trace.h"
+#include "ostui/BackEnd.h"
 #include "ostui/TerminalBackEnd.h"
 #include "RFL/Registry.h"
 #include "ServerAddress.h"
@@ -62,7 +63,8 @@ Library::Library(MainLoop& inLoop, Output& ioOutput) : mLoop(inLoop), mOutput(io
 }
 
 void Library::OnNetworkState(bool inIsDown) {
-    if (std::exchange(mNetworkIsDown, inIsDown) == inIsDown) {
+    // A window that is up says so itself.
+    if (std::exchange(mNetworkIsDown, inIsDown) == inIsDown || !ostui::GetRunningDialogs().empty()) {
         return;
     }
     mOutput.Note(!inIsDown ? "the hub is back"

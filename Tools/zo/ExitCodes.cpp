@@ -61,7 +61,7 @@ const std::vector<ExitCodeText>& AllExitCodes() {
         {ExitCode::Network, "network", "The hub could not be reached or is busy; it may be tried again."},
         {ExitCode::Tls, "tls", "A trusted, encrypted connection could not be made."},
         {ExitCode::PartlyDone, "partly-done", "Some of it was done and some failed."},
-        {ExitCode::Cancelled, "cancelled", "It was cancelled, by Ctrl-C or a signal."},
+        {ExitCode::Cancelled, "cancelled", "It was cancelled, by Ctrl-C, a signal or an answer."},
     };
     return table;
 }

@@ -20,6 +20,8 @@ public:
     struct Settings {
         bool json = false;
         bool quiet = false;
+        /// Nobody is to be asked.
+        bool noInput = false;
         ColorMode color = ColorMode::Auto;
         /// Leads error lines.
         std::string verb;
@@ -31,11 +33,10 @@ public:
     bool IsJson() const noexcept { return mSettings.json; }
     bool IsQuiet() const noexcept { return mSettings.quiet; }
     bool ErrorIsTerminal() const noexcept { return mErrorIsTerminal; }
-    /// Whether somebody sits before it who can be told and asked: standard input and error are a terminal,
-    /// and neither --json nor --quiet was given.
-    bool HasPerson() const noexcept {
-        return mInIsTerminal && mErrorIsTerminal && !mSettings.json && !mSettings.quiet;
-    }
+    /// Whether questions may be asked: standard input and standard error are a terminal.
+    bool MayAsk() const noexcept { return mInIsTerminal && mErrorIsTerminal && !mSettings.noInput; }
+    /// Whether somebody sits before it who can be told and asked: the same, and neither --json nor --quiet.
+    bool HasPerson() const noexcept { return MayAsk() && !mSettings.json && !mSettings.quiet; }
 
     /// With --json: one line on standard output.
     void Record(const Json& inObject);

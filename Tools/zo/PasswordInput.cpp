@@ -121,10 +121,6 @@ std::string PasswordFromStandardInput(const Interrupt& inInterrupt) {
     return RefuseEmpty(ReadLine(STDIN_FILENO, "standard input", &inInterrupt), "standard input");
 }
 
-bool MayAsk() {
-    return ::isatty(STDIN_FILENO) == 1 && ::isatty(STDERR_FILENO) == 1;
-}
-
 std::string AskOnTerminal(const std::string& inQuestion, const Interrupt& inInterrupt) {
     Show(inQuestion);
     return ReadLine(STDIN_FILENO, "the terminal", &inInterrupt);

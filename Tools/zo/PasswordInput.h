@@ -12,8 +12,6 @@ std::string PasswordFromFile(const std::string& inPath);
 /// The first line of standard input.
 std::string PasswordFromStandardInput(const Interrupt& inInterrupt);
 
-/// Whether questions may be asked: standard input and standard error are a terminal.
-bool MayAsk();
 /// Asks on the terminal. The answer is shown while it is typed.
 std::string AskOnTerminal(const std::string& inQuestion, const Interrupt& inInterrupt);
 /// Asks on the terminal with echo off; the terminal is put right again in every case.

@@ -46,7 +46,7 @@ std::string ObtainUser(Context& ioContext, const Target& inTarget) {
         return inTarget.user;
     }
     std::string user;
-    if (MayAsk()) {
+    if (ioContext.Out().MayAsk()) {
         user = AskOnTerminal("User: ", ioContext.Signals());
     }
     if (user.empty() || !IsUsableUserName(user)) {
@@ -63,7 +63,7 @@ std::string ObtainPassword(Context& ioContext, const Target& inTarget) {
     if (const auto file = args.Value("password-file")) {
         return PasswordFromFile(*file);
     }
-    if (!MayAsk()) {
+    if (!ioContext.Out().MayAsk()) {
         throw Failure(ExitCode::Usage, "there is no password and no terminal to ask for it",
                       "give --password-file FILE or --password-stdin");
     }

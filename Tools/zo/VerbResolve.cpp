@@ -3,6 +3,7 @@
 
 #include "Conflicts.h"
 #include "Failure.h"
+#include "GuidedFlow.h"
 #include "ostcore/serialization/JSON.h"
 #include "ostcore/utility/StringConversion.h"
 #include "ostnet/HeaderConstants.h"
@@ -248,6 +249,13 @@ void Decide(Context& ioContext, const WorkSession& inSession, const std::vector<
     ioContext.Out().Say("no conflict remains; share with 'zo share'");
 }
 
+void ResolveOnTheWay(Context& ioContext) {
+    RefuseWithOpenTransaction(ioContext, "resolving");
+    const WriteLock lock(ioContext);
+    WorkSession session = RequireSession(ioContext);
+    ResolveWithUser(ioContext, session);
+}
+
 }  // namespace
 
 void RunConflicts(Context& ioContext) {
@@ -267,6 +275,15 @@ void RunConflicts(Context& ioContext) {
 }
 
 void RunResolve(Context& ioContext) {
+    const bool isDecided = !ioContext.Args().PositionalsFrom(0).empty();
+    if (isDecided && ioContext.Args().Has("interactive")) {
+        throw Failure(ExitCode::Usage, "with --interactive the items are chosen on the way",
+                      "leave out the items, or --interactive");
+    }
+    if (AsksOnTheWay(ioContext, isDecided ? Asks::WhenTold : Asks::Usually,
+                     {"mine", "theirs", "copy", "all"})) {
+        return ResolveOnTheWay(ioContext);
+    }
     const Decision decision = DecisionOf(ioContext.Args());
     RefuseWithOpenTransaction(ioContext, "resolving");
     const WriteLock lock(ioContext);

@@ -82,7 +82,7 @@ void ConfirmDiscard(Context& ioContext, const WorkSession& inSession, std::size_
     }
     const std::string what = "discarding the session on " + inSession.productionName + " with " +
                              Plural(inChanges, "change") + " that nobody else has";
-    if (!MayAsk()) {
+    if (!ioContext.Out().MayAsk()) {
         throw Failure(ExitCode::Usage, what + " needs --yes where nobody can be asked");
     }
     const std::string answer =

@@ -3,8 +3,10 @@
 
 #include "Conflicts.h"
 #include "Failure.h"
+#include "GuidedFlow.h"
 #include "ostcore/utility/StringConversion.h"
 #include "Payloads.h"
+#include "Sharing.h"
 #include "Verbs.h"
 #include "WriteLock.h"
 #include "Writing.h"
@@ -14,32 +16,6 @@ namespace zo {
 namespace {
 
 using ostcore::utility::ToUTF16;
-
-constexpr const char* kBehindHint = "get the latest with 'zo latest', then share again";
-constexpr const char* kConflictsHint = "'zo conflicts' shows them, 'zo resolve' decides them";
-
-std::string Plural(std::size_t inCount, const char* inWhat) {
-    return std::to_string(inCount) + " " + inWhat + (inCount == 1 ? "" : "s");
-}
-
-bool HasConflicts(const std::vector<Change>& inOutgoing) {
-    for (const Change& change : inOutgoing) {
-        if (change.entry.IsInConflict()) {
-            return true;
-        }
-    }
-    return false;
-}
-
-// After a push or pull: what is open, and what was seen.
-void RememberMoved(Context& ioContext, const WorkSession& inSession, const std::string& inCommit,
-                   const std::string& inBase) {
-    ChangeOpen(ioContext, [&](OpenRecord& ioRecord) {
-        ioRecord.session = inSession.view.url;
-        ioRecord.seenCommit = inCommit;
-        ioRecord.commit = inBase;
-    });
-}
 
 // --- share
 
@@ -55,32 +31,15 @@ void TellWouldShare(Context& ioContext, const WorkSession& inSession, const std:
     const auto differences = inSession.session->GetOutgoingChanges();
     LoadResource(ioContext, differences, "loading what there is to share");
     const bool isBehind = differences->GetBaseCommitID().view() != head;
-    const bool conflicts = HasConflicts(inOutgoing);
+    const bool conflicts = CountConflicts(inOutgoing) != 0;
     Json json = ShareJson(inSession, inOutgoing.size(), inMessage);
     json.Set("commit", "").Set("shared", false).Set("behind", isBehind).Set("conflicts", conflicts);
     ioContext.Out().Record(json.Set("dryRun", true));
-    ioContext.Out().Say("would share " + Plural(inOutgoing.size(), "change") + " of " +
+    ioContext.Out().Say("would share " + Counted(inOutgoing.size(), "change") + " of " +
                         inSession.productionName +
                         (conflicts  ? ", but conflicts remain: zo conflicts"
                          : isBehind ? ", but there is something newer: zo latest"
                                     : ""));
-}
-
-Failure RefusedShare(Context& ioContext, const WorkSession& inSession, const Outcome& inOutcome,
-                     const std::string& inSeenCommit) {
-    const std::string what = "sharing the session on " + inSession.productionName;
-    if (inOutcome.result == ZOCL::kResultHTTPPreconditionFailed) {
-        return SessionMoved(ioContext, inSession, what, inSeenCommit);
-    }
-    if (inOutcome.result == ZOCL::kResultHTTPConflict) {
-        const std::vector<Change> outgoing = LoadOutgoing(ioContext, inSession);
-        if (HasConflicts(outgoing)) {
-            return Failure(ExitCode::ConflictsRemain, what + ": conflicts remain", kConflictsHint);
-        }
-        return Failure::OfRequest(what, inOutcome.result, inOutcome.response, kBehindHint);
-    }
-    return Failure::OfRequest(what, inOutcome.result, inOutcome.response,
-                              HintAfterLostAnswer(inOutcome.result, inOutcome.response));
 }
 
 void Share(Context& ioContext, const WorkSession& inSession, const std::vector<Change>& inOutgoing,
@@ -102,7 +61,7 @@ void Share(Context& ioContext, const WorkSession& inSession, const std::vector<C
     Json json = ShareJson(inSession, inOutgoing.size(), inMessage);
     json.Set("commit", commit).Set("shared", isNew).Set("behind", false).Set("conflicts", false);
     ioContext.Out().Record(json.Set("dryRun", false));
-    ioContext.Out().Say(isNew ? "shared " + Plural(inOutgoing.size(), "change") + " of " +
+    ioContext.Out().Say(isNew ? "shared " + Counted(inOutgoing.size(), "change") + " of " +
                                     inSession.productionName + " (commit " + commit + ")"
                               : "there was nothing to share");
 }
@@ -114,24 +73,6 @@ int StrategyOf(const std::string& inName) {
            : inName == "theirs" ? ZOCL::kMergeStrategy_Theirs
            : inName == "safe"   ? ZOCL::kMergeStrategy_Safe
                                 : ZOCL::kMergeStrategy_Interactive;
-}
-
-struct LatestState {
-    std::vector<Change> outgoing;
-    std::vector<Change> incoming;
-    std::string base;
-    std::string head;
-};
-
-LatestState LoadLatestState(Context& ioContext, const WorkSession& inSession) {
-    LatestState state;
-    const auto outgoing = inSession.session->GetOutgoingChanges();
-    const auto incoming = inSession.session->GetIncomingChanges();
-    state.outgoing = LoadChanges(ioContext, outgoing, "loading what the session has to share");
-    state.incoming = LoadChanges(ioContext, incoming, "loading what others have shared");
-    state.base = outgoing->GetBaseCommitID().str();
-    state.head = incoming->GetCommitID().str();
-    return state;
 }
 
 Json LatestJson(const WorkSession& inSession, const LatestState& inState) {
@@ -159,7 +100,7 @@ void TellWouldGet(Context& ioContext, const WorkSession& inSession, const Latest
     out.Record(json.Set("dryRun", true));
     out.Say(inState.base == inState.head
                 ? "there is nothing newer than what the session is based on"
-                : "would get " + Plural(inState.incoming.size(), "change") + " of others; " +
+                : "would get " + Counted(inState.incoming.size(), "change") + " of others; " +
                       (conflicts.empty() ? "none" : std::to_string(conflicts.size())) + " would conflict" +
                       (conflicts.empty() ? "" : ":"));
     TellConflicts(ioContext, conflicts, "predicted");
@@ -217,15 +158,10 @@ void GetLatest(Context& ioContext, WorkSession& ioSession, const LatestState& in
     json.Set("conflicts", conflicts.size()).Set("moved", base != inState.base).Set("merged", merged);
     Output& out = ioContext.Out();
     out.Record(json.Set("dryRun", false));
-    out.Say(base == inState.base ? "there is nothing newer than what the session is based on"
-                                 : "got " + Plural(inState.incoming.size(), "change") +
-                                       " of others; based on " + base + " now");
-    if (merged != 0) {
-        out.Say("merged the metadata of " + Plural(merged, "item") + " that both sides had changed");
-    }
+    SayGot(out, inState, base, merged);
     TellConflicts(ioContext, conflicts, "open");
     if (!conflicts.empty()) {
-        throw Failure(ExitCode::ConflictsRemain, Plural(conflicts.size(), "item") + " in conflict",
+        throw Failure(ExitCode::ConflictsRemain, Counted(conflicts.size(), "item") + " in conflict",
                       kConflictsHint);
     }
 }
@@ -233,9 +169,13 @@ void GetLatest(Context& ioContext, WorkSession& ioSession, const LatestState& in
 }  // namespace
 
 void RunShare(Context& ioContext) {
+    const bool asks = AsksOnTheWay(ioContext, Asks::Usually, {"message"});
     RefuseWithOpenTransaction(ioContext, "sharing");
     const WriteLock lock(ioContext);
-    const WorkSession session = RequireSession(ioContext);
+    WorkSession session = RequireSession(ioContext);
+    if (asks) {
+        return ShareWithUser(ioContext, session);
+    }
     const std::vector<Change> outgoing = LoadOutgoing(ioContext, session);
     const std::string message = ioContext.Args().ValueOr("message", "");
     if (ioContext.Args().Has("dry-run")) {
@@ -246,6 +186,7 @@ void RunShare(Context& ioContext) {
 }
 
 void RunLatest(Context& ioContext) {
+    const bool asks = AsksOnTheWay(ioContext, Asks::WhenTold, {"strategy"});
     const bool dryRun = ioContext.Args().Has("dry-run");
     if (!dryRun) {
         RefuseWithOpenTransaction(ioContext, "getting the latest");
@@ -254,6 +195,9 @@ void RunLatest(Context& ioContext) {
     const WriteLock lock(ioContext);
     // With no session there is nothing to bring up to date: a new one is based on the newest commit.
     WorkSession session = dryRun ? RequireSession(ioContext) : OpenSession(ioContext);
+    if (asks) {
+        return GetLatestWithUser(ioContext, session);
+    }
     const LatestState state = LoadLatestState(ioContext, session);
     if (dryRun) {
         TellWouldGet(ioContext, session, state);

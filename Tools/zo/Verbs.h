@@ -32,6 +32,7 @@ void RunResolve(Context& ioContext);
 void RunDiff(Context& ioContext);
 void RunHistory(Context& ioContext);
 void RunWatch(Context& ioContext);
+void RunDesk(Context& ioContext);
 void RunHelp(Context& ioContext);
 void RunVersion(Context& ioContext);
 void RunCompletion(Context& ioContext);

@@ -26,6 +26,7 @@ void Run(const std::vector<std::string>& inWords, zo::Output& ioOutput) {
     const zo::Arguments arguments = zo::Arguments::Parse(inWords);
     settings.json = arguments.Has("json");
     settings.quiet = arguments.Has("quiet");
+    settings.noInput = arguments.Has("no-input");
     settings.color = ColorModeOf(arguments);
     settings.verb = arguments.GetCommand().name;
     ioOutput.Configure(settings);
