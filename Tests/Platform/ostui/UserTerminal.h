@@ -5,7 +5,9 @@
 #include <pty.h>
 #include <unistd.h>
 
+#include <cerrno>
 #include <string>
+#include <system_error>
 #include <thread>
 #include <utility>
 #include <vector>
@@ -20,7 +22,9 @@ public:
     explicit UserTerminal(unsigned short inColumns = 0) {
         winsize size{};
         size.ws_col = inColumns;
-        EXPECT_EQ(openpty(&mUser, &mProgram, nullptr, nullptr, &size), 0);
+        if (openpty(&mUser, &mProgram, nullptr, nullptr, &size) != 0) {
+            throw std::system_error(errno, std::generic_category(), "no pseudo-terminal");
+        }
     }
     ~UserTerminal() {
         HangUp();
