@@ -6,7 +6,6 @@
 #include "ostcore/debug/DebugDatabase.h"
 #include "ostcore/debug/Trace.h"
 #include "ostcore/threads/Mutex.h"
-#include "ostnet/http/Compression.h"
 #include "RFL/DirectoryRegistry.h"
 
 namespace ZOCL {
@@ -136,26 +135,6 @@ void ReplaceContentCache(const shared_ptr<QM::DataCache>& inCache) {
 const ImmutableString& ContentName() {
     static const ImmutableString sName("gz");
     return sName;
-}
-
-void CacheContentLater(const ImmutableString& inContentID, const shared_ptr<RecycledMemory const>& inPayload,
-                       const function<bool(const function<void()>&)>& inPost) {
-    if (inContentID.empty() || !inPayload || inPayload->empty()) {
-        return;
-    }
-    const auto cache = GetContentCache();
-    if (cache && !cache->Contains(inContentID, ContentName())) {
-        inPost([inContentID, inPayload] { CompressAndCacheContent(inContentID, inPayload); });
-    }
-}
-
-void CompressAndCacheContent(const ImmutableString& inContentID,
-                             const shared_ptr<RecycledMemory const>& inPayload) {
-    const auto cache = GetContentCache();
-    if (cache && !inContentID.empty() && inPayload && !inPayload->empty() &&
-        !cache->Contains(inContentID, ContentName())) {
-        cache->Write(inContentID, ContentName(), ostnet::http::CompressPayload(inPayload));
-    }
 }
 
 }  // namespace ZOCL

@@ -20,12 +20,4 @@ void ReplaceContentCache(const shared_ptr<QM::DataCache>& inCache);
 /// The name under which payloads are stored, as gzip.
 const ImmutableString& ContentName();
 
-/// Keeps a payload that this library itself has written: packs and stores it on a worker, unless it is there
-/// already. What is empty is not kept.
-void CacheContentLater(const ImmutableString& inContentID, const shared_ptr<RecycledMemory const>& inPayload,
-                       const function<bool(const function<void()>&)>& inPost);
-/// The work of it, on the calling thread.
-void CompressAndCacheContent(const ImmutableString& inContentID,
-                             const shared_ptr<RecycledMemory const>& inPayload);
-
 }  // namespace ZOCL

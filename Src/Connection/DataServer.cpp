@@ -92,6 +92,7 @@ void DataServer::InitFromDiscoveryURL(const Settings& inSettings) {
         }
     };
     mChain = BuildRequestChain(callbacks, credentials.token);
+    mContentPacking = boost::make_shared<ContentPacking>(mChain.global);
     ScopedLock lock(IZOCDataServer::GetLock(), "DataServer::InitFromDiscoveryURL");
     mCredentials = std::move(credentials);
     mSavedCredentials = std::move(saved);

@@ -4,6 +4,7 @@
 #include <atomic>
 #include <unordered_map>
 
+#include "Connection/ContentPacking.h"
 #include "Connection/ContentReads.h"
 #include "Connection/ServiceDocument.h"
 #include "ostcore/threads/Scheduler.h"
@@ -277,6 +278,7 @@ private:
     bool mSecure = false;
     bool mBecomeLoggedIn = true;
     RequestChain mChain;
+    shared_ptr<ContentPacking> mContentPacking;
     const bool mUseSimpleContentCache;
     /// Null unless it is used.
     const shared_ptr<ContentMap> mSimpleContentCache;

@@ -236,8 +236,7 @@ void DataServer::CacheSimply(const ImmutableString& inContentID, const ResponseR
 
 void DataServer::CacheContent(const ImmutableString& inContentID, const Payload& inPayload) {
     if (!mUseSimpleContentCache) {
-        CacheContentLater(ContentKey(inContentID), inPayload,
-                          [this](const function<void()>& inFunction) { return PostFunction(inFunction, 0); });
+        mContentPacking->Add(ContentKey(inContentID), inPayload);
     }
 }
 
