@@ -32,9 +32,11 @@ std::size_t MostReadTurns() {
     return sMost;
 }
 
-/// How many writes of this process make another look worth while.
-std::size_t WritesBetweenLooks(std::size_t inMaximumCount) {
-    return std::max<std::size_t>(inMaximumCount / 32, 64);
+/// How much this process may add before another look is worth while. A look costs as much as there are files,
+/// so that a directory with room is looked at less often: four processes that fill it at once keep the bound.
+template <class Amount>
+Amount AddedBetweenLooks(Amount inMaximum, Amount inHeld) {
+    return std::max<Amount>({inMaximum / 32, inMaximum > inHeld ? (inMaximum - inHeld) / 4 : 0, 64});
 }
 
 }  // namespace
@@ -56,11 +58,15 @@ FileDataCache::FileDataCache(shared_ptr<CacheDirectory> inDirectory)
 bool FileDataCache::IsStored(const EntryKey& inKey) {
     {
         MutexLock lock(mMutex);
-        if (mPending.count(inKey) > 0 || mIndex->Contains(inKey)) {
+        if (IsKnown(inKey)) {
             return true;
         }
     }
     return mDirectory->Exists(inKey);
+}
+
+bool FileDataCache::IsKnown(const EntryKey& inKey) const {
+    return mPending.count(inKey) > 0 || mIndex->Contains(inKey);
 }
 
 std::vector<ImmutableString> FileDataCache::ListNames(const ImmutableString& inKey) {
@@ -69,14 +75,18 @@ std::vector<ImmutableString> FileDataCache::ListNames(const ImmutableString& inK
         return found;
     }
     EntryKey key = MakeEntryKeyWithoutName(inKey);
-    std::set<std::string> candidates;
+    std::vector<std::string> names, candidates;
     bool areNamesKnown = false;
     bool isLookDue = false;
     {
         MutexLock lock(mMutex);
-        candidates = mKnownNames;
         areNamesKnown = mHasLooked;
         isLookDue = ++mLookups == kLookupsBeforeLook;
+        for (const std::string& name : mKnownNames) {
+            if (SetName(key, name)) {
+                (IsKnown(key) ? names : candidates).push_back(name);
+            }
+        }
     }
     if (isLookDue) {
         PostLook();
@@ -84,12 +94,18 @@ std::vector<ImmutableString> FileDataCache::ListNames(const ImmutableString& inK
     // Before the first look nobody knows which names there are.
     if (!areNamesKnown) {
         const std::vector<std::string> listed = mDirectory->ListNames(key);
-        candidates.insert(listed.begin(), listed.end());
+        candidates.insert(candidates.end(), listed.begin(), listed.end());
     }
+    // Another process may have written it.
     for (const std::string& name : candidates) {
-        if (SetName(key, name) && IsStored(key)) {
-            found.emplace_back(name);
+        const bool isTold = std::find(names.begin(), names.end(), name) != names.end();
+        if (!isTold && SetName(key, name) && mDirectory->Exists(key)) {
+            names.push_back(name);
         }
+    }
+    std::sort(names.begin(), names.end());
+    for (const std::string& name : names) {
+        found.emplace_back(name);
     }
     return found;
 }
@@ -105,6 +121,8 @@ int FileDataCache::Read(const ImmutableString& inKey, const ImmutableString& inN
     if (mIsClosed || !inCompletion || !MakeEntryKey(inKey, inName, key)) {
         return kResultFailure;
     }
+    std::uint64_t number = 0;
+    bool isKnown = false, needsTurn = false;
     {
         MutexLock lock(mMutex);
         const auto pending = mPending.find(key);
@@ -112,21 +130,29 @@ int FileDataCache::Read(const ImmutableString& inKey, const ImmutableString& inN
             outPayload = pending->second;
             return kResultContentAvailable;
         }
+        isKnown = mIndex->Contains(key);
+        needsTurn = isKnown && QueueRead(key, inCompletion, number);
     }
-    if (!IsStored(key)) {
-        return kResultFailure;
-    }
-    std::uint64_t number = 0;
-    {
-        MutexLock lock(mMutex);
-        number = ++mLastRead;
-        mReads.push_back({number, key, inCompletion});
-        if (mReadTurns >= MostReadTurns()) {
-            return kResultContentPending;
+    if (!isKnown) {
+        if (!mDirectory->Exists(key)) {
+            return kResultFailure;
         }
-        ++mReadTurns;
+        MutexLock lock(mMutex);
+        needsTurn = QueueRead(key, inCompletion, number);
     }
-    return PostReads(number) ? kResultContentPending : kResultFailure;
+    return !needsTurn || PostReads(number) ? kResultContentPending : kResultFailure;
+}
+
+/// Whether another thread is to take a turn for it.
+bool FileDataCache::QueueRead(const EntryKey& inKey, const ReadCompletion& inCompletion,
+                              std::uint64_t& outNumber) {
+    outNumber = ++mLastRead;
+    mReads.push_back({outNumber, inKey, inCompletion});
+    if (mReadTurns >= MostReadTurns()) {
+        return false;
+    }
+    ++mReadTurns;
+    return true;
 }
 
 /// False when the read of that number will not take place.
@@ -317,6 +343,7 @@ void FileDataCache::WriteWithinBounds(const EntryKey& inKey, const Payload& inPa
         mIndex->Insert(inKey, size);
     }
     ++mWritesSinceLook;
+    mBytesSinceLook += size;
 }
 
 /// Takes the file out of the index whose turn it is to go, if one has to.
@@ -372,15 +399,14 @@ void FileDataCache::RemoveFile(const EntryKey& inKey) {
 
 /// False when nothing is known of the directory, so that nothing may be added to it.
 bool FileDataCache::LookIfItIsTime() {
-    std::size_t count = 0;
-    bool hasLooked = false;
+    bool isTime = false, hasLooked = false;
     {
         MutexLock lock(mMutex);
-        count = mMaximumCount;
         hasLooked = mHasLooked;
+        isTime = mWritesSinceLook >= AddedBetweenLooks(mMaximumCount, mCountAtLook) ||
+                 mBytesSinceLook >= AddedBetweenLooks(mMaximumBytes, mBytesAtLook);
     }
-    if (hasLooked && mWritesSinceLook < WritesBetweenLooks(count) &&
-        std::chrono::steady_clock::now() - mLastLook < kLookPeriod) {
+    if (hasLooked && !isTime && std::chrono::steady_clock::now() - mLastLook < kLookPeriod) {
         return true;
     }
     return LookAtDirectory() || hasLooked;
@@ -401,6 +427,9 @@ bool FileDataCache::LookAtDirectory() {
         }
     }
     mWritesSinceLook = 0;
+    mBytesSinceLook = 0;
+    mCountAtLook = index->Count();
+    mBytesAtLook = index->Bytes();
     mLastLook = std::chrono::steady_clock::now();
     {
         MutexLock lock(mMutex);

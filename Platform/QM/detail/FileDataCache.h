@@ -57,6 +57,8 @@ private:
     };
 
     explicit FileDataCache(shared_ptr<CacheDirectory> inDirectory);
+    bool QueueRead(const EntryKey& inKey, const ReadCompletion& inCompletion, std::uint64_t& outNumber)
+        ZO_REQUIRES(mMutex);
     bool PostReads(std::uint64_t inNumber);
     bool TakeRead(WaitingRead& outRead);
     void RunReads();
@@ -75,6 +77,7 @@ private:
     bool LookIfItIsTime();
     void PostLook();
     bool IsStored(const EntryKey& inKey);
+    bool IsKnown(const EntryKey& inKey) const ZO_REQUIRES(mMutex);
     void NoteUse(const EntryKey& inKey, std::uint64_t inSize);
     void ReadFile(const EntryKey& inKey, const ReadCompletion& inCompletion);
 
@@ -85,6 +88,9 @@ private:
 
     // Of the writer alone.
     std::size_t mWritesSinceLook = 0;
+    std::uint64_t mBytesSinceLook = 0;
+    std::size_t mCountAtLook = 0;
+    std::uint64_t mBytesAtLook = 0;
     std::chrono::steady_clock::time_point mLastLook;
 
     mutable ostcore::threads::Mutex mMutex;
