@@ -11,7 +11,7 @@ namespace ostnet {
 namespace http {
 namespace {
 
-constexpr int kCompressionLevel = 6;
+constexpr int kCompressionLevel = 5;
 constexpr std::size_t kSmallestMember = 18;
 constexpr std::size_t kSmallestOutput = 4096;
 
