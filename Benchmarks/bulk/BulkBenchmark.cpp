@@ -4,7 +4,10 @@
 #include <chrono>
 #include <cstdio>
 #include <cstdlib>
+#include <ctime>
 #include <functional>
+#include <thread>
+#include <utility>
 #include <vector>
 
 #include "FormRecorder.h"
@@ -26,7 +29,9 @@ constexpr std::size_t kAssets = 10'000;
 /// One by one takes long, and its rate does not depend on the number.
 constexpr std::size_t kSingleAssets = 1'000;
 constexpr int kRounds = 3;
+/// A form is full when its payloads exceed this, or all of it exceeds this and an eighth.
 constexpr std::size_t kFormLimit = 33'554'432;
+constexpr std::size_t kLargestForm = kFormLimit + kFormLimit / 8;
 /// What one asset adds to a form at most: its sidecar, its properties and three part heads.
 constexpr std::size_t kAssetBytes = bench::kSidecarBytes + 2048;
 constexpr double kWantedOverSingle = 10.0;
@@ -85,6 +90,17 @@ struct Site {
     }
 };
 
+/// What a transaction has written is packed and stored behind its end; nothing else is to be measured
+/// meanwhile.
+void RestUntilIdle() {
+    std::clock_t before = std::clock(), used = CLOCKS_PER_SEC;
+    while (used > CLOCKS_PER_SEC / 100) {
+        std::this_thread::sleep_for(std::chrono::milliseconds(200));
+        const std::clock_t now = std::clock();
+        used = now - std::exchange(before, now);
+    }
+}
+
 double InBulk(Site& ioSite, const std::vector<Clip>& inClips) {
     Ended ended;
     const auto start = Clock::now();
@@ -102,7 +118,9 @@ double InBulk(Site& ioSite, const std::vector<Clip>& inClips) {
     }
     bulk->FinishedEditing();
     ended.Wait(true, "the bulk transaction failed");
-    return SecondsSince(start);
+    const double seconds = SecondsSince(start);
+    RestUntilIdle();
+    return seconds;
 }
 
 double OneByOne(const std::vector<Clip>& inClips) {
@@ -156,16 +174,18 @@ double Bare(bench::FormRecorder& ioRecorder, const std::vector<bench::RecordedFo
     return seconds;
 }
 
-// Every form but the last is the first that is larger than the limit.
+/// All forms are full, but for the last one. They are packed side by side, so that they reach the network in
+/// any order.
 bool KeepTheSizeRule(const std::vector<bench::RecordedForm>& inForms) {
-    for (std::size_t i = 0; i < inForms.size(); ++i) {
-        const std::size_t size = inForms[i].UnpackedSize();
-        const bool isLast = i + 1 == inForms.size();
-        if (size == 0 || size > kFormLimit + kAssetBytes || (!isLast && size <= kFormLimit)) {
+    std::size_t withRoom = 0;
+    for (const bench::RecordedForm& form : inForms) {
+        const std::size_t size = form.UnpackedSize();
+        if (size == 0 || size > kLargestForm + kAssetBytes) {
             return false;
         }
+        withRoom += size <= kFormLimit ? 1 : 0;
     }
-    return true;
+    return !inForms.empty() && withRoom <= 1;
 }
 
 const char* Judge(double inRatio, double inTarget) {

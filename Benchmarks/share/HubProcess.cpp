@@ -1,7 +1,7 @@
 #include "HubProcess.h"
 
 #include <fcntl.h>
-#include <spawn.h>
+#include <sys/prctl.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -16,18 +16,20 @@ namespace bench {
 namespace {
 
 pid_t Spawn(std::vector<std::string> inWords, int inOutput) {
-    posix_spawn_file_actions_t actions;
-    posix_spawn_file_actions_init(&actions);
-    posix_spawn_file_actions_adddup2(&actions, inOutput, STDOUT_FILENO);
     std::vector<char*> arguments;
     for (std::string& word : inWords) {
         arguments.push_back(word.data());
     }
     arguments.push_back(nullptr);
-    pid_t process = -1;
-    const int error = posix_spawn(&process, arguments[0], &actions, nullptr, arguments.data(), environ);
-    posix_spawn_file_actions_destroy(&actions);
-    if (error != 0) {
+    const pid_t process = fork();
+    if (process == 0) {
+        // A benchmark that gives up leaves no hub behind, which would hold its output open.
+        prctl(PR_SET_PDEATHSIG, SIGKILL);
+        dup2(inOutput, STDOUT_FILENO);
+        execv(arguments[0], arguments.data());
+        _exit(127);
+    }
+    if (process < 0) {
         throw std::runtime_error("The hub cannot be started from " + inWords[0] + ".");
     }
     return process;
