@@ -44,7 +44,7 @@ std::string Written(BulkPartName const& inName) {
 void CheckParts(Request const& inRequest) {
     try {
         Form const form(inRequest);
-        bool const isMultipart = inRequest.headers[0].second.find("multipart") != std::string::npos;
+        bool const isMultipart = inRequest.headers[0].second.rfind("multipart/", 0) == 0;
         for (auto const& part : form.Parts()) {
             Require(!part.name.empty());
             Require(form.Find(part.name) != nullptr);
