@@ -21,8 +21,10 @@ build: packages
 demo: build
 	bash Tools/demo/demo.sh build/dev
 
+# REPEAT=2 runs a test that failed once more, and tells both runs.
+REPEAT ?= 1
 test: build
-	ctest --preset dev -j $(JOBS)
+	ctest --preset dev -j $(JOBS) --repeat until-pass:$(REPEAT)
 
 # The tests of the request chain again and again, until one fails: make soak COUNT=1000
 COUNT ?= 100
