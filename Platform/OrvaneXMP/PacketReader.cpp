@@ -9,6 +9,7 @@
 #include <stdexcept>
 
 #include "OrvaneXMP/detail/ParserMemory.h"
+#include "OrvaneXMP/detail/QualifiedNames.h"
 #include "OrvaneXMP/detail/RdfBuilder.h"
 #include "OrvaneXMP/detail/Unicode.h"
 
@@ -63,17 +64,26 @@ private:
 /// keeps its own and stops the run.
 class Run {
 public:
-    explicit Run(const char* inEncoding)
-        : mParser(XML_ParserCreate_MM(inEncoding, &BoundedParserMemory(), " "), &XML_ParserFree) {
+    /// Who resolves prefixes. The parser does it for each name anew, and with the last word on what is
+    /// allowed; a run with prefixes resolved here is quicker, and what it refuses is for the parser to judge.
+    enum class Prefixes { ByParser, Here };
+
+    Run(const char* inEncoding, Prefixes inPrefixes)
+        : mParser(MakeParser(inEncoding, inPrefixes), &XML_ParserFree) {
         if (!mParser) {
             throw std::bad_alloc();
         }
         XML_SetUserData(mParser.get(), this);
-        XML_SetElementHandler(mParser.get(), &OnStart, &OnEnd);
         XML_SetCharacterDataHandler(mParser.get(), &OnCharacters);
-        XML_SetProcessingInstructionHandler(mParser.get(), &OnInstruction);
-        XML_SetStartNamespaceDeclHandler(mParser.get(), &OnPrefix);
         XML_SetStartDoctypeDeclHandler(mParser.get(), &OnDoctype);
+        if (inPrefixes == Prefixes::ByParser) {
+            XML_SetElementHandler(mParser.get(), &OnStart, &OnEnd);
+            XML_SetProcessingInstructionHandler(mParser.get(), &OnInstruction);
+            XML_SetStartNamespaceDeclHandler(mParser.get(), &OnPrefix);
+        } else {
+            XML_SetElementHandler(mParser.get(), &OnQualifiedStart, &OnQualifiedEnd);
+            XML_SetProcessingInstructionHandler(mParser.get(), &OnQualifiedInstruction);
+        }
     }
 
     ReadResult Read(std::string_view inText) {
@@ -93,6 +103,12 @@ public:
     }
 
 private:
+    static XML_Parser MakeParser(const char* inEncoding, Prefixes inPrefixes) {
+        return inPrefixes == Prefixes::ByParser
+                   ? XML_ParserCreate_MM(inEncoding, &BoundedParserMemory(), " ")
+                   : XML_ParserCreate_MM(inEncoding, &HalfOfParserMemory(), nullptr);
+    }
+
     bool Feed(std::string_view inText) {
         const std::size_t pieceSize = inText.size() <= kLargestTag ? inText.size() : kPieceSize;
         std::size_t fed = 0;
@@ -126,6 +142,23 @@ private:
         XML_StopParser(mParser.get(), XML_FALSE);
     }
 
+    void StartQualified(const XML_Char* inName, const XML_Char** inAttributes) {
+        mNames.Open();
+        mAttributes.clear();
+        for (const XML_Char** at = inAttributes; *at; at += 2) {
+            const bool isDeclaration = at[0][0] == 'x' && QualifiedNames::IsDeclaration(at[0]);
+            if (isDeclaration) {
+                mBuilder.DeclarePrefix(mNames.Declare(at[0], at[1]), at[1]);
+            } else {
+                mAttributes.push_back({nullptr, at[0], at[1]});
+            }
+        }
+        for (Attribute& attribute : mAttributes) {
+            attribute.known = &mNames.OfAttribute(attribute.name);
+        }
+        mBuilder.StartElement(mNames.OfElement(inName), mAttributes);
+    }
+
     /// The parser may still tell of events after it was stopped.
     template <class F>
     static void Guarded(void* inSelf, const F& inBody) {
@@ -150,8 +183,30 @@ private:
     static void OnStart(void* inSelf, const XML_Char* inName, const XML_Char** inAttributes) {
         Guarded(inSelf, [&](Run& ioRun) {
             ioRun.mHasRoot = true;
-            ioRun.mBuilder.StartElement(inName, inAttributes);
+            ioRun.mAttributes.clear();
+            for (const XML_Char** at = inAttributes; *at; at += 2) {
+                ioRun.mAttributes.push_back({nullptr, at[0], at[1]});
+            }
+            ioRun.mBuilder.StartElement(ioRun.mTerms.OfElement(inName), ioRun.mAttributes);
         });
+    }
+    static void OnQualifiedStart(void* inSelf, const XML_Char* inName, const XML_Char** inAttributes) {
+        Guarded(inSelf, [&](Run& ioRun) {
+            ioRun.mHasRoot = true;
+            ioRun.StartQualified(inName, inAttributes);
+        });
+    }
+    static void OnQualifiedEnd(void* inSelf, const XML_Char*) {
+        Guarded(inSelf, [](Run& ioRun) {
+            ioRun.mBuilder.EndElement();
+            ioRun.mNames.Close();
+        });
+    }
+    static void OnQualifiedInstruction(void* inSelf, const XML_Char* inTarget, const XML_Char* inData) {
+        if (std::string_view(inTarget).find(':') == std::string_view::npos) {
+            return OnInstruction(inSelf, inTarget, inData);
+        }
+        Guarded(inSelf, [](Run&) { throw Refusal{"the target of an instruction has a colon"}; });
     }
     static void OnEnd(void* inSelf, const XML_Char*) {
         Guarded(inSelf, [](Run& ioRun) { ioRun.mBuilder.EndElement(); });
@@ -182,7 +237,10 @@ private:
     }
 
     std::unique_ptr<XML_ParserStruct, decltype(&XML_ParserFree)> mParser;
-    RdfBuilder mBuilder;
+    Terms mTerms;
+    QualifiedNames mNames{mTerms};
+    RdfBuilder mBuilder{mTerms};
+    std::vector<Attribute> mAttributes;
     Wrapper mWrapper;
     bool mHasRoot = false;
     bool mIsStopped = false;
@@ -191,6 +249,11 @@ private:
     std::size_t mLine = 0;
     std::size_t mColumn = 0;
 };
+
+ReadResult ReadText(std::string_view inText, const char* inEncoding) {
+    ReadResult quick = Run(inEncoding, Run::Prefixes::Here).Read(inText);
+    return quick ? std::move(quick) : Run(inEncoding, Run::Prefixes::ByParser).Read(inText);
+}
 
 }  // namespace
 
@@ -203,14 +266,14 @@ ReadResult ReadPacket(std::string_view inBytes) {
     const TextForm form = FindTextForm(inBytes);
     if (form == TextForm::EightBit) {
         return inBytes.size() > kMaximumPacketSize ? Refused("the packet is too large", 0, 0)
-                                                   : Run(nullptr).Read(inBytes);
+                                                   : ReadText(inBytes, nullptr);
     }
     std::string text;
     if (inBytes.size() > 4 * kMaximumPacketSize || !ConvertToUTF8(inBytes, form, text) ||
         text.size() > kMaximumPacketSize) {
         return Refused("the packet is too large, or no well-formed UTF-16 or UTF-32", 0, 0);
     }
-    return Run("UTF-8").Read(text);
+    return ReadText(text, "UTF-8");
 }
 
 }  // namespace OrvaneXMP

@@ -174,7 +174,9 @@ private:
         }
     }
     void Release() const noexcept {
-        if (mData && mData->count.fetch_sub(1, std::memory_order_acq_rel) == 1) {
+        // Who holds the only reference need not take it back in one step: nobody else can copy it.
+        if (mData && (mData->count.load(std::memory_order_acquire) == 1 ||
+                      mData->count.fetch_sub(1, std::memory_order_acq_rel) == 1)) {
             Destroy(mData);
         }
     }

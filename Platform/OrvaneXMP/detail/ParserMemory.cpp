@@ -24,8 +24,9 @@ char* HeadOf(void* inBlock) noexcept {
     return static_cast<char*>(inBlock) - kHead;
 }
 
+template <std::size_t Most>
 void* Allocate(std::size_t inSize) {
-    if (inSize > kMostBytes - gBytesHeld) {
+    if (gBytesHeld > Most || inSize > Most - gBytesHeld) {
         return nullptr;
     }
     auto* head = static_cast<char*>(std::malloc(inSize + kHead));
@@ -44,12 +45,14 @@ void Free(void* inBlock) {
     }
 }
 
+template <std::size_t Most>
 void* Reallocate(void* inBlock, std::size_t inSize) {
     if (!inBlock) {
-        return Allocate(inSize);
+        return Allocate<Most>(inSize);
     }
     const std::size_t former = SizeOf(HeadOf(inBlock));
-    if (inSize > kMostBytes - (gBytesHeld - former)) {
+    const std::size_t others = gBytesHeld - former;
+    if (others > Most || inSize > Most - others) {
         return nullptr;
     }
     auto* head = static_cast<char*>(std::realloc(HeadOf(inBlock), inSize + kHead));
@@ -57,14 +60,20 @@ void* Reallocate(void* inBlock, std::size_t inSize) {
         return nullptr;
     }
     new (head) std::size_t(inSize);
-    gBytesHeld = gBytesHeld - former + inSize;
+    gBytesHeld = others + inSize;
     return head + kHead;
 }
 
 }  // namespace
 
 const XML_Memory_Handling_Suite& BoundedParserMemory() noexcept {
-    static const XML_Memory_Handling_Suite suite{&Allocate, &Reallocate, &Free};
+    static const XML_Memory_Handling_Suite suite{&Allocate<kMostBytes>, &Reallocate<kMostBytes>, &Free};
+    return suite;
+}
+
+const XML_Memory_Handling_Suite& HalfOfParserMemory() noexcept {
+    static const XML_Memory_Handling_Suite suite{&Allocate<kMostBytes / 2>, &Reallocate<kMostBytes / 2>,
+                                                 &Free};
     return suite;
 }
 

@@ -32,7 +32,9 @@ std::string Quoted(const Name& inName) {
 }
 
 bool IsSpace(std::string_view inText) noexcept {
-    return inText.find_first_not_of(" \t\r\n") == std::string_view::npos;
+    return std::all_of(inText.begin(), inText.end(), [](char inByte) {
+        return inByte == ' ' || inByte == '\n' || inByte == '\t' || inByte == '\r';
+    });
 }
 
 Node MakeText(std::string_view inText) {
@@ -41,6 +43,12 @@ Node MakeText(std::string_view inText) {
 
 Node MakeURI(std::string_view inURI) {
     return NodeFactory::MakeSimple(Kind::URI, inURI, nullptr, 0);
+}
+
+/// Of the names in RDF that get into a tree, the one besides TypeName().
+const Name& ValueName() {
+    static const Name name(kNamespace_RDF, "value");
+    return name;
 }
 
 bool HasLanguage(const Node& inNode) {
@@ -60,8 +68,15 @@ private:
 
 }  // namespace
 
-RdfBuilder::Frame RdfBuilder::MakeFrame(Role inRole) const {
-    Frame frame;
+RdfBuilder::RdfBuilder(Terms& inTerms) : mTerms(inTerms) {
+    constexpr std::size_t kUsual = 32;
+    mFrames.reserve(kUsual);
+    mFields.reserve(kUsual);
+    mItems.reserve(kUsual);
+}
+
+RdfBuilder::Frame& RdfBuilder::Push(Role inRole) {
+    Frame& frame = mFrames.emplace_back();
     frame.role = inRole;
     frame.firstField = mFields.size();
     frame.firstItem = mItems.size();
@@ -69,82 +84,74 @@ RdfBuilder::Frame RdfBuilder::MakeFrame(Role inRole) const {
     return frame;
 }
 
-void RdfBuilder::StartElement(const char* inName, const char** inAttributes) {
-    const KnownName& name = mTerms.OfElement(inName);
-    if (name.term == Term::NoNamespace) {
-        RefuseName("an element without a namespace:", name.name);
+void RdfBuilder::StartElement(const KnownName& inName, AttributeList inAttributes) {
+    if (inName.term == Term::NoNamespace) {
+        RefuseName("an element without a namespace:", inName.name);
     }
-    std::size_t attributes = 0;
-    while (inAttributes[attributes * 2]) {
-        ++attributes;
-    }
-    if (attributes > kMostAttributes) {
+    if (inAttributes.size() > kMostAttributes) {
         throw Refusal{"too many attributes in one element"};
     }
     if (mFrames.size() >= kMostFrames) {
         throw Refusal{"the elements are nested too deep"};
     }
     if (mFrames.empty()) {
-        return StartRoot(name, inAttributes);
+        return StartRoot(inName, inAttributes);
     }
     switch (mFrames.back().role) {
         case Role::Meta:
-            return StartWrapper(name, inAttributes);
+            return StartWrapper(inName, inAttributes);
         case Role::RDF:
-            return StartSubject(name, inAttributes);
+            return StartSubject(inName, inAttributes);
         case Role::Subject:
         case Role::Structure:
-            return StartField(name, inAttributes);
+            return StartField(inName, inAttributes);
         case Role::Container:
-            return StartItem(name, inAttributes);
+            return StartItem(inName, inAttributes);
         case Role::Property:
-            return mFrames.back().form == Form::FieldsInside ? StartField(name, inAttributes)
-                                                             : StartValue(name, inAttributes);
+            return mFrames.back().form == Form::FieldsInside ? StartField(inName, inAttributes)
+                                                             : StartValue(inName, inAttributes);
     }
 }
 
-void RdfBuilder::StartRoot(const KnownName& inName, const char** inAttributes) {
+void RdfBuilder::StartRoot(const KnownName& inName, AttributeList inAttributes) {
     if (inName.term != Term::Meta) {
         return StartWrapper(inName, inAttributes);
     }
-    Frame frame = MakeFrame(Role::Meta);
+    Frame& frame = Push(Role::Meta);
     // The attributes of x:xmpmeta tell who wrote the packet, and nothing of what it describes.
-    for (const char** at = inAttributes; *at; at += 2) {
-        if (mTerms.OfAttribute(at[0]).term == Term::Language) {
-            frame.language = MakeText(at[1]);
+    for (const Attribute& attribute : inAttributes) {
+        if (mTerms.Of(attribute).term == Term::Language) {
+            frame.language = MakeText(attribute.value);
         }
     }
-    mFrames.push_back(std::move(frame));
 }
 
-void RdfBuilder::StartWrapper(const KnownName& inName, const char** inAttributes) {
+void RdfBuilder::StartWrapper(const KnownName& inName, AttributeList inAttributes) {
     if (inName.term != Term::RDF || mHasRDF) {
         RefuseName("where one rdf:RDF is expected, there is", inName.name);
     }
     mHasRDF = true;
-    Frame frame = MakeFrame(Role::RDF);
+    Frame& frame = Push(Role::RDF);
     const Attributes attributes = ReadAttributes(inAttributes, frame);
     if (mFields.size() != frame.firstField || attributes.about) {
         throw Refusal{"rdf:RDF has attributes"};
     }
-    if (!frame.language.IsPresent() && !mFrames.empty()) {
-        frame.language = mFrames.back().language;
+    if (!frame.language.IsPresent() && mFrames.size() > 1) {
+        frame.language = Parent().language;
     }
-    mFrames.push_back(std::move(frame));
 }
 
-void RdfBuilder::StartSubject(const KnownName& inName, const char** inAttributes) {
+void RdfBuilder::StartSubject(const KnownName& inName, AttributeList inAttributes) {
     if (inName.term != Term::Description && inName.term != Term::Property && inName.term != Term::Meta) {
         RefuseName("where a resource is expected, there is", inName.name);
     }
-    Frame frame = MakeFrame(Role::Subject);
+    Frame& frame = Push(Role::Subject);
     AddType(inName);
     SetAbout(ReadAttributes(inAttributes, frame));
     if (!frame.language.IsPresent()) {
-        frame.language = mFrames.back().language;
+        frame.language = Parent().language;
     }
     InheritLanguage(frame.firstField, frame.language);
-    mFrames.push_back(std::move(frame));
 }
 
 void RdfBuilder::SetAbout(const Attributes& inAttributes) {
@@ -157,41 +164,39 @@ void RdfBuilder::SetAbout(const Attributes& inAttributes) {
     }
 }
 
-void RdfBuilder::StartField(const KnownName& inName, const char** inAttributes) {
+void RdfBuilder::StartField(const KnownName& inName, AttributeList inAttributes) {
     const bool isInSubject = mFrames.back().role == Role::Subject;
     const bool isProperty = inName.term == Term::Property || inName.term == Term::Meta ||
                             inName.term == Term::Type || (inName.term == Term::Value && !isInSubject);
     if (!isProperty) {
         RefuseName("where a property is expected, there is", inName.name);
     }
-    Frame frame = MakeFrame(Role::Property);
+    Frame& frame = Push(Role::Property);
     frame.name = inName.name;
-    StartProperty(std::move(frame), inAttributes);
+    StartProperty(frame, inAttributes);
 }
 
-void RdfBuilder::StartItem(const KnownName& inName, const char** inAttributes) {
+void RdfBuilder::StartItem(const KnownName& inName, AttributeList inAttributes) {
     if (inName.term != Term::Item && inName.term != Term::NumberedItem) {
         RefuseName("where an item of an array is expected, there is", inName.name);
     }
-    Frame& container = mFrames.back();
-    Frame frame = MakeFrame(Role::Property);
-    frame.number = inName.term == Term::Item ? ++container.counted : inName.number;
-    StartProperty(std::move(frame), inAttributes);
+    Frame& frame = Push(Role::Property);
+    frame.number = inName.term == Term::Item ? ++Parent().counted : inName.number;
+    StartProperty(frame, inAttributes);
 }
 
-void RdfBuilder::StartProperty(Frame inFrame, const char** inAttributes) {
-    const Attributes attributes = ReadAttributes(inAttributes, inFrame);
-    inFrame.form = FormOf(attributes, inFrame);
-    if (inFrame.form == Form::Reference) {
-        inFrame.value = MakeURI(attributes.resource);
+void RdfBuilder::StartProperty(Frame& ioFrame, AttributeList inAttributes) {
+    const Attributes attributes = ReadAttributes(inAttributes, ioFrame);
+    ioFrame.form = FormOf(attributes, ioFrame);
+    if (ioFrame.form == Form::Reference) {
+        ioFrame.value = MakeURI(attributes.resource);
     }
-    const Frame& parent = mFrames.back();
-    const bool inherits = parent.role == Role::Subject && !inFrame.language.IsPresent() &&
-                          !parent.language.Value().empty() && inFrame.form != Form::Reference;
+    const Frame& parent = Parent();
+    const bool inherits = parent.role == Role::Subject && !ioFrame.language.IsPresent() &&
+                          !parent.language.Value().empty() && ioFrame.form != Form::Reference;
     if (inherits) {
-        inFrame.language = parent.language;
+        ioFrame.language = parent.language;
     }
-    mFrames.push_back(std::move(inFrame));
 }
 
 RdfBuilder::Form RdfBuilder::FormOf(const Attributes& inAttributes, const Frame& inFrame) const {
@@ -218,7 +223,7 @@ RdfBuilder::Form RdfBuilder::FormOf(const Attributes& inAttributes, const Frame&
     return hasFields ? Form::FieldsInTag : Form::Text;
 }
 
-void RdfBuilder::StartValue(const KnownName& inName, const char** inAttributes) {
+void RdfBuilder::StartValue(const KnownName& inName, AttributeList inAttributes) {
     Frame& property = mFrames.back();
     if (property.form != Form::Text || property.datatype.IsPresent()) {
         RefuseName("a property has one value, and behind it there is", inName.name);
@@ -230,7 +235,7 @@ void RdfBuilder::StartValue(const KnownName& inName, const char** inAttributes) 
         inName.term != Term::Meta) {
         RefuseName("where a value is expected, there is", inName.name);
     }
-    Frame frame = MakeFrame(isArray ? Role::Container : Role::Structure);
+    Frame& frame = Push(isArray ? Role::Container : Role::Structure);
     if (isArray) {
         frame.arrayKind = inName.term == Term::Bag   ? Kind::Unordered
                           : inName.term == Term::Seq ? Kind::Ordered
@@ -243,9 +248,8 @@ void RdfBuilder::StartValue(const KnownName& inName, const char** inAttributes) 
         throw Refusal{"a resource within a resource: rdf:about inside of a value"};
     }
     if (!frame.language.IsPresent()) {
-        frame.language = property.language;
+        frame.language = Parent().language;
     }
-    mFrames.push_back(std::move(frame));
 }
 
 void RdfBuilder::AddType(const KnownName& inName) {
@@ -257,14 +261,14 @@ void RdfBuilder::AddType(const KnownName& inName) {
     mFields.push_back({TypeName(), MakeURI(uri)});
 }
 
-RdfBuilder::Attributes RdfBuilder::ReadAttributes(const char** inAttributes, Frame& ioFrame) {
+RdfBuilder::Attributes RdfBuilder::ReadAttributes(AttributeList inAttributes, Frame& ioFrame) {
     Attributes attributes;
     const bool isProperty = ioFrame.role == Role::Property;
-    for (const char** at = inAttributes; *at; at += 2) {
-        const KnownName& name = mTerms.OfAttribute(at[0]);
+    for (const Attribute& attribute : inAttributes) {
+        const KnownName& name = mTerms.Of(attribute);
         switch (name.term) {
             case Term::Language:
-                ioFrame.language = MakeText(at[1]);
+                ioFrame.language = MakeText(attribute.value);
                 break;
             case Term::OtherOfXML:
                 break;
@@ -272,19 +276,19 @@ RdfBuilder::Attributes RdfBuilder::ReadAttributes(const char** inAttributes, Fra
                 attributes.hasNodeID = true;
                 break;
             case Term::About:
-                attributes.about = at[1];
+                attributes.about = attribute.value;
                 break;
             case Term::Resource:
-                attributes.resource = at[1];
+                attributes.resource = attribute.value;
                 break;
             case Term::ParseType:
-                attributes.parseType = at[1];
+                attributes.parseType = attribute.value;
                 break;
             case Term::Datatype:
-                ioFrame.datatype = MakeText(at[1]);
+                ioFrame.datatype = MakeText(attribute.value);
                 break;
             default:
-                ReadPropertyAttribute(name, at[1], ioFrame);
+                ReadPropertyAttribute(name, attribute.value, ioFrame);
         }
     }
     const bool hasOfProperty = attributes.resource || attributes.parseType || ioFrame.datatype.IsPresent();
@@ -345,8 +349,7 @@ void RdfBuilder::EndElement() {
 }
 
 void RdfBuilder::EndProperty() {
-    Frame frame = std::move(mFrames.back());
-    mFrames.pop_back();
+    Frame& frame = mFrames.back();
     Count();
     Node node = TakeProperty(frame);
     if (frame.number > 0) {
@@ -354,6 +357,7 @@ void RdfBuilder::EndProperty() {
     } else {
         mFields.push_back({std::move(frame.name), std::move(node)});
     }
+    mFrames.pop_back();
 }
 
 Node RdfBuilder::TakeProperty(Frame& ioFrame) {
@@ -391,11 +395,8 @@ Node RdfBuilder::TakeText(Frame& ioFrame) {
 }
 
 Node RdfBuilder::TakeReference(Frame& ioFrame) {
-    const auto isReserved = [](const Field& inField) {
-        return inField.name.NamespaceURI() == kNamespace_RDF && inField.name != TypeName();
-    };
     if (std::any_of(mFields.begin() + static_cast<std::ptrdiff_t>(ioFrame.firstField), mFields.end(),
-                    isReserved)) {
+                    [](const Field& inField) { return inField.name == ValueName(); })) {
         throw Refusal{"rdf:resource and rdf:value in one element"};
     }
     InheritLanguage(ioFrame.firstField, ioFrame.language);
@@ -410,9 +411,7 @@ Node RdfBuilder::TakeReference(Frame& ioFrame) {
 }
 
 Node RdfBuilder::TakeStructure(std::size_t inFirstField, const Node& inLanguage) {
-    const auto isValue = [](const Field& inField) {
-        return inField.name != TypeName() && inField.name.NamespaceURI() == kNamespace_RDF;
-    };
+    const auto isValue = [](const Field& inField) { return inField.name == ValueName(); };
     const std::size_t count = SortedFields(inFirstField);
     const auto first = mFields.begin() + static_cast<std::ptrdiff_t>(inFirstField);
     const auto value = std::find_if(first, first + static_cast<std::ptrdiff_t>(count), isValue);

@@ -17,8 +17,12 @@ namespace OrvaneXMP {
 /// what the data model cannot hold.
 class RdfBuilder {
 public:
-    /// inAttributes holds names and values in turn, ended by a null.
-    void StartElement(const char* inName, const char** inAttributes);
+    using AttributeList = const std::vector<Attribute>&;
+
+    /// inTerms outlives this.
+    explicit RdfBuilder(Terms& inTerms);
+
+    void StartElement(const KnownName& inName, AttributeList inAttributes);
     void EndElement();
     void Characters(std::string_view inText);
     void DeclarePrefix(std::string_view inPrefix, std::string_view inURI);
@@ -63,17 +67,18 @@ private:
         bool hasNodeID = false;
     };
 
-    Frame MakeFrame(Role inRole) const;
-    void StartRoot(const KnownName& inName, const char** inAttributes);
-    void StartWrapper(const KnownName& inName, const char** inAttributes);
-    void StartSubject(const KnownName& inName, const char** inAttributes);
-    void StartField(const KnownName& inName, const char** inAttributes);
-    void StartItem(const KnownName& inName, const char** inAttributes);
-    void StartProperty(Frame inFrame, const char** inAttributes);
-    void StartValue(const KnownName& inName, const char** inAttributes);
+    Frame& Push(Role inRole);
+    Frame& Parent() noexcept { return mFrames[mFrames.size() - 2]; }
+    void StartRoot(const KnownName& inName, AttributeList inAttributes);
+    void StartWrapper(const KnownName& inName, AttributeList inAttributes);
+    void StartSubject(const KnownName& inName, AttributeList inAttributes);
+    void StartField(const KnownName& inName, AttributeList inAttributes);
+    void StartItem(const KnownName& inName, AttributeList inAttributes);
+    void StartProperty(Frame& ioFrame, AttributeList inAttributes);
+    void StartValue(const KnownName& inName, AttributeList inAttributes);
     void AddType(const KnownName& inName);
 
-    Attributes ReadAttributes(const char** inAttributes, Frame& ioFrame);
+    Attributes ReadAttributes(AttributeList inAttributes, Frame& ioFrame);
     void ReadPropertyAttribute(const KnownName& inName, const char* inValue, const Frame& inFrame);
     Form FormOf(const Attributes& inAttributes, const Frame& inFrame) const;
     void SetAbout(const Attributes& inAttributes);
@@ -93,7 +98,7 @@ private:
     void RequireOnlySpaceSince(std::size_t inStart);
     void Count();
 
-    Terms mTerms;
+    Terms& mTerms;
     std::vector<Frame> mFrames;
     std::vector<Field> mFields;
     std::vector<Item> mItems;

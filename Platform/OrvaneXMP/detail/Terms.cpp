@@ -98,20 +98,23 @@ KnownName Classify(std::string_view inName, bool inIsAttribute) {
 
 }  // namespace
 
-const KnownName& Terms::Look(const char* inName, Table& ioTable) {
-    const std::string_view text(inName);
-    const auto found = ioTable.find(text);
-    if (found != ioTable.end()) {
-        return found->second;
-    }
-    if (ioTable.size() >= kMostNames) {
+Terms::Terms() : mElements(kMostNames), mAttributes(kMostNames) {}
+
+KnownName& Terms::Look(std::string_view inName, NameTable<KnownName>& ioTable) {
+    KnownName* const known = ioTable.Find(inName);
+    if (!known) {
         throw Refusal{"too many different names"};
     }
-    KnownName known = Classify(text, &ioTable == &mAttributes);
-    known.key = ImmutableString(text);
-    known.name = known.term == Term::Type ? TypeName() : NodeFactory::MakeName(text);
-    const std::string_view key = known.key.view();
-    return ioTable.emplace(key, std::move(known)).first->second;
+    if (known->name.empty()) {
+        *known = New(inName, &ioTable == &mAttributes);
+    }
+    return *known;
+}
+
+KnownName Terms::New(std::string_view inName, bool inIsAttribute) {
+    KnownName known = Classify(inName, inIsAttribute);
+    known.name = known.term == Term::Type ? TypeName() : NodeFactory::MakeName(inName);
+    return known;
 }
 
 }  // namespace OrvaneXMP

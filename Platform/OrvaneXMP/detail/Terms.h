@@ -2,9 +2,10 @@
 #pragma once
 
 #include <cstdint>
+#include <string>
 #include <string_view>
-#include <unordered_map>
 
+#include "OrvaneXMP/detail/NameTable.h"
 #include "OrvaneXMP/Tree.h"
 
 namespace OrvaneXMP {
@@ -39,9 +40,16 @@ struct KnownName {
     Term term = Term::Property;
     /// Of a numbered item, from 1.
     std::uint32_t number = 0;
+    /// The number of the last element that had it as an attribute, for who gives elements numbers from 1.
+    std::uint32_t seenIn = 0;
     Name name;
-    /// The name as the parser gave it.
-    ImmutableString key;
+};
+
+/// One of an element, whose name may still have to be looked up.
+struct Attribute {
+    const KnownName* known;
+    const char* name;
+    const char* value;
 };
 
 /// Why a packet is refused; caught before it leaves the reader.
@@ -51,17 +59,25 @@ struct Refusal {
 
 class Terms {
 public:
-    /// A name as the parser gives it: URI, space, local name; without a namespace the local name alone.
-    const KnownName& OfElement(const char* inName) { return Look(inName, mElements); }
+    Terms();
+
+    /// A name as a parser that knows namespaces gives it: URI, space, local name; without a namespace the
+    /// local name alone.
+    const KnownName& OfElement(std::string_view inName) { return Look(inName, mElements); }
     /// Attributes that RDF lets stand without a namespace are known by their old form as well.
-    const KnownName& OfAttribute(const char* inName) { return Look(inName, mAttributes); }
+    KnownName& OfAttribute(std::string_view inName) { return Look(inName, mAttributes); }
+    const KnownName& Of(const Attribute& inAttribute) {
+        return inAttribute.known ? *inAttribute.known : OfAttribute(inAttribute.name);
+    }
+
+    /// For who has a table of its own.
+    static KnownName New(std::string_view inName, bool inIsAttribute);
 
 private:
-    using Table = std::unordered_map<std::string_view, KnownName>;
-    const KnownName& Look(const char* inName, Table& ioTable);
+    KnownName& Look(std::string_view inName, NameTable<KnownName>& ioTable);
 
-    Table mElements;
-    Table mAttributes;
+    NameTable<KnownName> mElements;
+    NameTable<KnownName> mAttributes;
 };
 
 }  // namespace OrvaneXMP

@@ -5,78 +5,19 @@
 #include <cstring>
 #include <new>
 #include <ostream>
-#include <random>
 #include <thread>
 
 #include "ostcore/threads/ThreadAnnotations.h"
+#include "ostcore/utility/TextHash.h"
 
 namespace ostcore {
 namespace utility {
-
-/// Head of an entry; the bytes and a NUL follow it in the same allocation.
-struct ImmutableString::Entry {
-    std::atomic<std::uint32_t> count;
-    std::uint32_t unused;
-    std::uint64_t hash;
-    std::size_t size;
-    Entry* next;
-
-    char* Text() noexcept { return reinterpret_cast<char*>(this + 1); }
-};
 
 namespace {
 
 using Entry = ImmutableString::Entry;
 constexpr std::size_t kShardCount = 128;
 constexpr std::size_t kFirstBucketCount = 32;
-
-std::uint64_t MultiplyAndFold(std::uint64_t inLeft, std::uint64_t inRight) noexcept {
-    __extension__ using Wide = unsigned __int128;
-    const Wide product = static_cast<Wide>(inLeft) * inRight;
-    return static_cast<std::uint64_t>(product) ^ static_cast<std::uint64_t>(product >> 64);
-}
-
-std::uint64_t ReadWord(const char* inBytes) noexcept {
-    std::uint64_t word;
-    std::memcpy(&word, inBytes, sizeof(word));
-    return word;
-}
-
-struct WordPair {
-    std::uint64_t first;
-    std::uint64_t second;
-};
-
-// Up to 16 bytes as two words; shorter texts are told apart by their size, which is hashed as well.
-WordPair ReadTail(const char* inBytes, std::size_t inSize) noexcept {
-    if (inSize >= sizeof(std::uint64_t)) {
-        return {ReadWord(inBytes), ReadWord(inBytes + inSize - sizeof(std::uint64_t))};
-    }
-    std::uint64_t word = 0;
-    for (std::size_t i = 0; i < inSize; ++i) {
-        word = (word << 8) | static_cast<unsigned char>(inBytes[i]);
-    }
-    return {word, 0};
-}
-
-// Seeded anew in each process, so that a peer cannot send texts that it knows to share a bucket.
-std::uint64_t HashText(std::string_view inText) noexcept {
-    static const std::uint64_t seed = [] {
-        std::random_device device;
-        return (static_cast<std::uint64_t>(device()) << 32) | device();
-    }();
-    constexpr std::uint64_t kFactor = 0x9FB21C651E98DF25ull;
-    std::uint64_t hash = seed ^ (inText.size() * 0x9E3779B97F4A7C15ull);
-    const char* bytes = inText.data();
-    std::size_t left = inText.size();
-    for (; left > sizeof(WordPair); left -= sizeof(WordPair), bytes += sizeof(WordPair)) {
-        hash =
-            MultiplyAndFold(hash ^ ReadWord(bytes), seed ^ ReadWord(bytes + sizeof(std::uint64_t)) ^ kFactor);
-    }
-    const WordPair tail = ReadTail(bytes, left);
-    hash = MultiplyAndFold(hash ^ tail.first, seed ^ tail.second ^ kFactor);
-    return MultiplyAndFold(hash ^ seed, kFactor);
-}
 
 /// The lock of a shard, made for the few instructions of a look-up: one atomic step to take it, a plain store
 /// to let it go. Who finds it held spins for about as long as a look-up takes, then lets others run; the naps
@@ -227,7 +168,7 @@ Entry* InternText(std::string_view inText) {
     if (inText.empty()) {
         return nullptr;
     }
-    const std::uint64_t hash = HashText(inText);
+    const std::uint64_t hash = HashText(inText, TextHashSeed());
     return ShardOf(hash).Intern(inText, hash);
 }
 
@@ -253,24 +194,7 @@ ImmutableString& ImmutableString::operator=(ImmutableString&& inOther) noexcept 
     return *this;
 }
 
-std::size_t ImmutableString::size() const noexcept {
-    return mEntry ? mEntry->size : 0;
-}
-
-const char* ImmutableString::c_str() const noexcept {
-    return mEntry ? mEntry->Text() : "";
-}
-
-void ImmutableString::Retain() noexcept {
-    if (mEntry) {
-        mEntry->count.fetch_add(1, std::memory_order_relaxed);
-    }
-}
-
-void ImmutableString::Release() noexcept {
-    if (!mEntry) {
-        return;
-    }
+void ImmutableString::ReleaseEntry() noexcept {
     std::uint32_t count = mEntry->count.load(std::memory_order_relaxed);
     while (count > 1) {
         if (mEntry->count.compare_exchange_weak(count, count - 1, std::memory_order_release,

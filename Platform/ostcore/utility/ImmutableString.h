@@ -1,6 +1,7 @@
 // Interned immutable UTF-8 strings: equal texts share one entry, so equality is identity.
 #pragma once
 
+#include <atomic>
 #include <cstddef>
 #include <cstdint>
 #include <functional>
@@ -41,9 +42,9 @@ public:
     /// True for the null string, which is also the empty one.
     bool empty() const noexcept { return mEntry == nullptr; }
     bool IsNull() const noexcept { return mEntry == nullptr; }
-    std::size_t size() const noexcept;
+    inline std::size_t size() const noexcept;
     /// NUL-terminated; valid as long as any string with this text lives.
-    const char* c_str() const noexcept;
+    inline const char* c_str() const noexcept;
     std::string_view view() const noexcept { return {c_str(), size()}; }
     std::string str() const { return std::string(view()); }
     operator std::string_view() const noexcept { return view(); }
@@ -68,11 +69,41 @@ public:
     struct Entry;
 
 private:
-    void Retain() noexcept;
-    void Release() noexcept;
+    inline void Retain() noexcept;
+    void Release() noexcept {
+        if (mEntry) {
+            ReleaseEntry();
+        }
+    }
+    void ReleaseEntry() noexcept;
 
     Entry* mEntry = nullptr;
 };
+
+/// Head of an entry; the bytes and a NUL follow it in the same allocation.
+struct ImmutableString::Entry {
+    std::atomic<std::uint32_t> count;
+    std::uint32_t unused;
+    std::uint64_t hash;
+    std::size_t size;
+    Entry* next;
+
+    char* Text() noexcept { return reinterpret_cast<char*>(this + 1); }
+};
+
+inline std::size_t ImmutableString::size() const noexcept {
+    return mEntry ? mEntry->size : 0;
+}
+
+inline const char* ImmutableString::c_str() const noexcept {
+    return mEntry ? mEntry->Text() : "";
+}
+
+inline void ImmutableString::Retain() noexcept {
+    if (mEntry) {
+        mEntry->count.fetch_add(1, std::memory_order_relaxed);
+    }
+}
 
 /// Orders by text, for output that people read.
 struct AlphabeticLess {
