@@ -16,7 +16,14 @@ AuthorizationProcessor::AuthorizationProcessor(shared_ptr<ostnet::http::RequestP
                                                function<void()> inTokenNotification)
     : ForwardingProcessor(std::move(inNext)), mTokenNotification(std::move(inTokenNotification)) {}
 
-bool AuthorizationProcessor::MakeRequest(const Guid& inRequestID, PackedRequest inPacked,
+/// What a completion needs, in one block: the function that holds it is copied from layer to layer.
+struct AuthorizationProcessor::Flight {
+    shared_ptr<AuthorizationProcessor> layer;
+    RequestRef request;
+    ImmutableString token;
+};
+
+bool AuthorizationProcessor::MakeRequest(const Guid& inRequestID, PackedRequest&& inPacked,
                                          const CompletionFunction& inCompletion) {
     ImmutableString token;
     {
@@ -26,7 +33,8 @@ bool AuthorizationProcessor::MakeRequest(const Guid& inRequestID, PackedRequest 
             return false;  // the ID is in use, if only by a request that waits for a token
         }
     }
-    if (!SendWithToken(Request{std::move(inPacked), inCompletion, inRequestID}, token)) {
+    const auto request = boost::make_shared<Request>(Request{std::move(inPacked), inCompletion, inRequestID});
+    if (!SendWithToken(request, token)) {
         Forget(inRequestID);
         return false;
     }
@@ -37,18 +45,19 @@ bool AuthorizationProcessor::MakeRequest(const Guid& inRequestID, PackedRequest 
     return true;
 }
 
-bool AuthorizationProcessor::SendWithToken(const Request& inRequest, const ImmutableString& inToken) {
-    return inRequest.makeRequest(inToken, [self = shared_from_this(), inRequest, inToken](
-                                              const Guid& inID, const shared_ptr<Response>& inResponse) {
-        self->OnCompleted(inRequest, inToken, inID, inResponse);
-    });
+bool AuthorizationProcessor::SendWithToken(const RequestRef& inRequest, const ImmutableString& inToken) {
+    const auto flight = boost::make_shared<Flight>(Flight{shared_from_this(), inRequest, inToken});
+    return SendPacked(*inRequest, inToken,
+                      [flight](const Guid& inID, const shared_ptr<Response>& inResponse) {
+                          flight->layer->OnCompleted(flight->request, flight->token, inID, inResponse);
+                      });
 }
 
-void AuthorizationProcessor::OnCompleted(const Request& inRequest, const ImmutableString& inUsedToken,
+void AuthorizationProcessor::OnCompleted(const RequestRef& inRequest, const ImmutableString& inUsedToken,
                                          const Guid& inRequestID, const shared_ptr<Response>& inResponse) {
     if (!inResponse || inResponse->status != kStatusUnauthorized) {
-        Forget(inRequest.requestID);
-        inRequest.completion(inRequestID, inResponse);
+        Forget(inRequest->requestID);
+        inRequest->completion(inRequestID, inResponse);
         return;
     }
     enum class Verdict { kGiveBack, kCancelled, kSendAgain, kParked } verdict = Verdict::kParked;
@@ -57,10 +66,10 @@ void AuthorizationProcessor::OnCompleted(const Request& inRequest, const Immutab
     {
         ScopedLock lock(mMutex, "AuthorizationProcessor::CompletionFunction");
         current = mToken;
-        const auto found = mRequests.find(inRequest.requestID);
+        const auto found = mRequests.find(inRequest->requestID);
         if (found != mRequests.end() && found->second) {
             verdict = Verdict::kCancelled;
-        } else if (mToken.IsNull() || !mTokenNotification || inRequest.renewals >= kMaximumRenewals) {
+        } else if (mToken.IsNull() || !mTokenNotification || inRequest->renewals >= kMaximumRenewals) {
             verdict = Verdict::kGiveBack;
         } else if (inUsedToken != mToken) {
             verdict = Verdict::kSendAgain;
@@ -70,16 +79,16 @@ void AuthorizationProcessor::OnCompleted(const Request& inRequest, const Immutab
             }
             mState = State::kTokenAskedFor;
             mParked.push_back({inRequest, inUsedToken, inResponse});
-            ++mParked.back().request.renewals;
+            ++inRequest->renewals;
         }
     }
     switch (verdict) {
         case Verdict::kGiveBack:
-            Forget(inRequest.requestID);
-            inRequest.completion(inRequestID, inResponse);
+            Forget(inRequest->requestID);
+            inRequest->completion(inRequestID, inResponse);
             break;
         case Verdict::kCancelled:
-            EndCancelled(inRequest);
+            EndCancelled(*inRequest);
             break;
         case Verdict::kSendAgain:
             SendAgain({inRequest, inUsedToken, inResponse}, current);
@@ -104,11 +113,11 @@ void AuthorizationProcessor::SetAuthToken(const ImmutableString& inToken) {
     for (const ParkedRequest& entry : parked) {
         if (!inToken.IsNull() && inToken != entry.token) {
             SendAgain(entry, inToken);
-        } else if (IsCancelled(entry.request.requestID)) {
-            EndCancelled(entry.request);
+        } else if (IsCancelled(entry.request->requestID)) {
+            EndCancelled(*entry.request);
         } else {
-            Forget(entry.request.requestID);
-            endings.push_back({entry.request.completion, entry.request.requestID, entry.response});
+            Forget(entry.request->requestID);
+            endings.push_back({entry.request->completion, entry.request->requestID, entry.response});
         }
     }
     EndLater(std::move(endings));
@@ -143,7 +152,7 @@ void AuthorizationProcessor::TryToCancelRequest(const Guid& inRequestID) {
             request->second = true;
         }
         const auto found = std::find_if(mParked.begin(), mParked.end(), [&](const ParkedRequest& inParked) {
-            return inParked.request.requestID == inRequestID;
+            return inParked.request->requestID == inRequestID;
         });
         if (found != mParked.end()) {
             parked = std::move(*found);
@@ -151,19 +160,19 @@ void AuthorizationProcessor::TryToCancelRequest(const Guid& inRequestID) {
         }
     }
     if (parked) {
-        EndCancelled(parked->request);
+        EndCancelled(*parked->request);
     } else {
         Next()->TryToCancelRequest(inRequestID);
     }
 }
 
 void AuthorizationProcessor::SendAgain(const ParkedRequest& inParked, const ImmutableString& inToken) {
-    const Guid& requestID = inParked.request.requestID;
+    const Guid& requestID = inParked.request->requestID;
     if (IsCancelled(requestID)) {
-        EndCancelled(inParked.request);
+        EndCancelled(*inParked.request);
     } else if (!SendWithToken(inParked.request, inToken)) {
         if (IsCancelled(requestID)) {
-            EndCancelled(inParked.request);
+            EndCancelled(*inParked.request);
         } else {
             EndWithRefusal(inParked);
         }
@@ -198,8 +207,8 @@ void AuthorizationProcessor::EndLater(std::vector<Ending> inEndings) {
 }
 
 void AuthorizationProcessor::EndWithRefusal(const ParkedRequest& inParked) {
-    Forget(inParked.request.requestID);
-    EndLater({Ending{inParked.request.completion, inParked.request.requestID, inParked.response}});
+    Forget(inParked.request->requestID);
+    EndLater({Ending{inParked.request->completion, inParked.request->requestID, inParked.response}});
 }
 
 void AuthorizationProcessor::EndCancelled(const Request& inRequest) {

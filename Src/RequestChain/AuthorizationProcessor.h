@@ -6,6 +6,7 @@
 
 #include "ostcore/threads/RecursiveMutex.h"
 #include "ostnet/http/RequestProcessor.h"
+#include "RequestChain/PackedRequest.h"
 #include "ZOClient/Types.h"
 
 namespace ZOCL {
@@ -88,18 +89,18 @@ public:
     void ClearAuthTokenNotificationFunction();
 
 private:
-    /// The request as a whole, to be sent with a token as often as needed.
-    using PackedRequest =
-        function<bool(const ImmutableString& inToken, const CompletionFunction& inCompletion)>;
     enum class State { kNoToken, kTokenHeld, kTokenAskedFor };
+    /// Sent with a token as often as needed, once at a time.
     struct Request {
-        PackedRequest makeRequest;
+        PackedRequest packed;
         CompletionFunction completion;
         Guid requestID;
-        int renewals = 0;
+        int renewals = 0;  // guarded by the mutex of the layer
     };
+    using RequestRef = shared_ptr<Request>;
+    struct Flight;
     struct ParkedRequest {
-        Request request;
+        RequestRef request;
         ImmutableString token;
         shared_ptr<ostnet::Response> response;
     };
@@ -109,9 +110,12 @@ private:
         shared_ptr<ostnet::Response> response;
     };
 
-    bool MakeRequest(const Guid& inRequestID, PackedRequest inPacked, const CompletionFunction& inCompletion);
-    bool SendWithToken(const Request& inRequest, const ImmutableString& inToken);
-    void OnCompleted(const Request& inRequest, const ImmutableString& inUsedToken, const Guid& inRequestID,
+    bool MakeRequest(const Guid& inRequestID, PackedRequest&& inPacked,
+                     const CompletionFunction& inCompletion);
+    bool SendWithToken(const RequestRef& inRequest, const ImmutableString& inToken);
+    bool SendPacked(const Request& inRequest, const ImmutableString& inToken,
+                    const CompletionFunction& inCompletion);
+    void OnCompleted(const RequestRef& inRequest, const ImmutableString& inUsedToken, const Guid& inRequestID,
                      const shared_ptr<ostnet::Response>& inResponse);
     /// Sends a request that was taken out again; cancels that came meanwhile are honoured.
     void SendAgain(const ParkedRequest& inParked, const ImmutableString& inToken);

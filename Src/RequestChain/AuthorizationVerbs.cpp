@@ -5,14 +5,7 @@
 
 namespace ZOCL {
 
-namespace {
-
-/// One copy for all sendings: a packed request is copied from hand to hand, and a form can be large.
-shared_ptr<ostnet::http::Form const> Keep(const ostnet::http::Form& inForm) {
-    return boost::make_shared<ostnet::http::Form>(inForm);
-}
-
-}  // namespace
+using Verb = PackedRequest::Verb;
 
 void AuthorizationProcessor::AddAuthorizationHeaders(const ImmutableString& inToken, Headers& ioHeaders) {
     if (!inToken.IsNull()) {
@@ -26,71 +19,73 @@ void AuthorizationProcessor::AddAuthorizationHeaders(const ImmutableString& inTo
 bool AuthorizationProcessor::GET(const Guid& inRequestID, const CompletionFunction& inCompletion,
                                  const ImmutableString& inURL, Headers inHeaders,
                                  const RequestOptions& inOptions) {
-    PackedRequest packed = [this, inRequestID, inURL, headers = std::move(inHeaders), inOptions](
-                               const ImmutableString& inToken, const CompletionFunction& inDone) {
-        return SendGET(inToken, inRequestID, inDone, inURL, headers, inOptions);
-    };
-    return MakeRequest(inRequestID, std::move(packed), inCompletion);
+    return MakeRequest(inRequestID, Pack(Verb::kGet, inURL, std::move(inHeaders), inOptions), inCompletion);
 }
 
 bool AuthorizationProcessor::HEAD(const Guid& inRequestID, const CompletionFunction& inCompletion,
                                   const ImmutableString& inURL, Headers inHeaders,
                                   const RequestOptions& inOptions) {
-    PackedRequest packed = [this, inRequestID, inURL, headers = std::move(inHeaders), inOptions](
-                               const ImmutableString& inToken, const CompletionFunction& inDone) {
-        return SendHEAD(inToken, inRequestID, inDone, inURL, headers, inOptions);
-    };
-    return MakeRequest(inRequestID, std::move(packed), inCompletion);
+    return MakeRequest(inRequestID, Pack(Verb::kHead, inURL, std::move(inHeaders), inOptions), inCompletion);
 }
 
 bool AuthorizationProcessor::PUT(const Guid& inRequestID, const CompletionFunction& inCompletion,
                                  const ImmutableString& inURL, Headers inHeaders, const Payload& inPayload,
                                  const RequestOptions& inOptions) {
-    PackedRequest packed = [this, inRequestID, inURL, headers = std::move(inHeaders), inPayload, inOptions](
-                               const ImmutableString& inToken, const CompletionFunction& inDone) {
-        return SendPUT(inToken, inRequestID, inDone, inURL, headers, inPayload, inOptions);
-    };
-    return MakeRequest(inRequestID, std::move(packed), inCompletion);
+    return MakeRequest(inRequestID, Pack(Verb::kPut, inURL, std::move(inHeaders), inPayload, inOptions),
+                       inCompletion);
 }
 
 bool AuthorizationProcessor::PUT(const Guid& inRequestID, const CompletionFunction& inCompletion,
                                  const ImmutableString& inURL, Headers inHeaders, const Form& inForm,
                                  const RequestOptions& inOptions) {
-    PackedRequest packed = [this, inRequestID, inURL, headers = std::move(inHeaders), form = Keep(inForm),
-                            inOptions](const ImmutableString& inToken, const CompletionFunction& inDone) {
-        return SendPUT(inToken, inRequestID, inDone, inURL, headers, *form, inOptions);
-    };
-    return MakeRequest(inRequestID, std::move(packed), inCompletion);
+    return MakeRequest(inRequestID, Pack(Verb::kPut, inURL, std::move(inHeaders), inForm, inOptions),
+                       inCompletion);
 }
 
 bool AuthorizationProcessor::POST(const Guid& inRequestID, const CompletionFunction& inCompletion,
                                   const ImmutableString& inURL, Headers inHeaders, const Payload& inPayload,
                                   const RequestOptions& inOptions) {
-    PackedRequest packed = [this, inRequestID, inURL, headers = std::move(inHeaders), inPayload, inOptions](
-                               const ImmutableString& inToken, const CompletionFunction& inDone) {
-        return SendPOST(inToken, inRequestID, inDone, inURL, headers, inPayload, inOptions);
-    };
-    return MakeRequest(inRequestID, std::move(packed), inCompletion);
+    return MakeRequest(inRequestID, Pack(Verb::kPost, inURL, std::move(inHeaders), inPayload, inOptions),
+                       inCompletion);
 }
 
 bool AuthorizationProcessor::POST(const Guid& inRequestID, const CompletionFunction& inCompletion,
                                   const ImmutableString& inURL, Headers inHeaders, const Form& inForm,
                                   const RequestOptions& inOptions) {
-    PackedRequest packed = [this, inRequestID, inURL, headers = std::move(inHeaders), form = Keep(inForm),
-                            inOptions](const ImmutableString& inToken, const CompletionFunction& inDone) {
-        return SendPOST(inToken, inRequestID, inDone, inURL, headers, *form, inOptions);
-    };
-    return MakeRequest(inRequestID, std::move(packed), inCompletion);
+    return MakeRequest(inRequestID, Pack(Verb::kPost, inURL, std::move(inHeaders), inForm, inOptions),
+                       inCompletion);
 }
 
 bool AuthorizationProcessor::DELETE(const Guid& inRequestID, const CompletionFunction& inCompletion,
                                     const ImmutableString& inURL, Headers inHeaders,
                                     const RequestOptions& inOptions) {
-    PackedRequest packed = [this, inRequestID, inURL, headers = std::move(inHeaders), inOptions](
-                               const ImmutableString& inToken, const CompletionFunction& inDone) {
-        return SendDELETE(inToken, inRequestID, inDone, inURL, headers, inOptions);
-    };
-    return MakeRequest(inRequestID, std::move(packed), inCompletion);
+    return MakeRequest(inRequestID, Pack(Verb::kDelete, inURL, std::move(inHeaders), inOptions),
+                       inCompletion);
+}
+
+bool AuthorizationProcessor::SendPacked(const Request& inRequest, const ImmutableString& inToken,
+                                        const CompletionFunction& inCompletion) {
+    const PackedRequest& packed = inRequest.packed;
+    const Guid& requestID = inRequest.requestID;
+    switch (packed.verb) {
+        case Verb::kGet:
+            return SendGET(inToken, requestID, inCompletion, packed.url, packed.headers, packed.options);
+        case Verb::kHead:
+            return SendHEAD(inToken, requestID, inCompletion, packed.url, packed.headers, packed.options);
+        case Verb::kPut:
+            return packed.form ? SendPUT(inToken, requestID, inCompletion, packed.url, packed.headers,
+                                         *packed.form, packed.options)
+                               : SendPUT(inToken, requestID, inCompletion, packed.url, packed.headers,
+                                         packed.payload, packed.options);
+        case Verb::kPost:
+            return packed.form ? SendPOST(inToken, requestID, inCompletion, packed.url, packed.headers,
+                                          *packed.form, packed.options)
+                               : SendPOST(inToken, requestID, inCompletion, packed.url, packed.headers,
+                                          packed.payload, packed.options);
+        case Verb::kDelete:
+            return SendDELETE(inToken, requestID, inCompletion, packed.url, packed.headers, packed.options);
+    }
+    return false;
 }
 
 bool AuthorizationProcessor::SendGET(const ImmutableString& inToken, const Guid& inRequestID,

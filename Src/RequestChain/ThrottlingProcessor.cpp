@@ -12,6 +12,11 @@ ThrottlingProcessor::ThrottlingProcessor(shared_ptr<ostnet::http::RequestProcess
 
 ThrottlingProcessor::~ThrottlingProcessor() = default;
 
+struct ThrottlingProcessor::Slot {
+    shared_ptr<ThrottlingProcessor> layer;
+    CompletionFunction completion;
+};
+
 bool ThrottlingProcessor::MakeRequest(const Guid& inRequestID, const CompletionFunction& inCompletion,
                                       PackedRequest&& inPacked) {
     {
@@ -32,12 +37,13 @@ bool ThrottlingProcessor::MakeRequest(const Guid& inRequestID, const CompletionF
 
 bool ThrottlingProcessor::Send(const Guid& inRequestID, const CompletionFunction& inCompletion,
                                PackedRequest& ioPacked) {
-    return ioPacked.SendOnce(
-        *Next(), inRequestID,
-        [self = shared_from_this(), inCompletion](const Guid& inID, const shared_ptr<Response>& inResponse) {
-            self->HandSlotOn();
-            inCompletion(inID, inResponse);
-        });
+    // In one block, since the function is copied from layer to layer.
+    const auto slot = boost::make_shared<Slot>(Slot{shared_from_this(), inCompletion});
+    return ioPacked.SendOnce(*Next(), inRequestID,
+                             [slot](const Guid& inID, const shared_ptr<Response>& inResponse) {
+                                 slot->layer->HandSlotOn();
+                                 slot->completion(inID, inResponse);
+                             });
 }
 
 void ThrottlingProcessor::HandSlotOn() {

@@ -56,6 +56,7 @@ protected:
                      PackedRequest&& inPacked);
 
 private:
+    struct Slot;
     struct QueuedRequest {
         Guid requestID;
         PackedRequest packed;
