@@ -1,9 +1,11 @@
 #include "QM/detail/CacheEntry.h"
 
 #include <libdeflate.h>
-#include <openssl/sha.h>
+#include <openssl/evp.h>
 
 #include <algorithm>
+#include <memory>
+#include <new>
 
 namespace QM {
 namespace detail {
@@ -38,6 +40,22 @@ std::uint32_t Checksum(const void* inBytes, std::size_t inSize) {
     return libdeflate_crc32(0, inBytes, inSize);
 }
 
+using Digest = std::array<unsigned char, 32>;
+
+/// The method is looked up once and the state kept: for a key both cost more than the digest.
+Digest SHA256Of(std::string_view inText) {
+    static const EVP_MD* const sMethod = EVP_MD_fetch(nullptr, "SHA256", nullptr);
+    thread_local const std::unique_ptr<EVP_MD_CTX, decltype(&EVP_MD_CTX_free)> sState(EVP_MD_CTX_new(),
+                                                                                      &EVP_MD_CTX_free);
+    Digest digest{};
+    if (!sState || EVP_DigestInit_ex(sState.get(), sMethod, nullptr) != 1 ||
+        EVP_DigestUpdate(sState.get(), inText.data(), inText.size()) != 1 ||
+        EVP_DigestFinal_ex(sState.get(), digest.data(), nullptr) != 1) {
+        throw std::bad_alloc();
+    }
+    return digest;
+}
+
 int DigitOf(char inCharacter) {
     const char* const found = std::find(kHexadecimal, kHexadecimal + 16, inCharacter);
     return static_cast<int>(found - kHexadecimal);
@@ -61,8 +79,7 @@ bool SetName(EntryKey& ioKey, std::string_view inName) {
 
 EntryKey MakeEntryKeyWithoutName(std::string_view inKey) {
     EntryKey key;
-    std::array<unsigned char, SHA256_DIGEST_LENGTH> digest{};
-    ::SHA256(reinterpret_cast<const unsigned char*>(inKey.data()), inKey.size(), digest.data());
+    const Digest digest = SHA256Of(inKey);
     std::copy_n(digest.begin(), key.digest.size(), key.digest.begin());
     return key;
 }
