@@ -9,7 +9,7 @@ export CCACHE_NOHASHDIR := 1
 # By its list of headers, without a run of the preprocessor before each compilation.
 export CCACHE_DEPEND := 1
 
-.PHONY: demo test soak bench compare packages build release asan tsan analysis format format-check locks tidy clean
+.PHONY: demo test soak bench compare fuzz packages build release asan tsan analysis format format-check locks tidy clean
 
 packages:
 	@Packaging/install-packages.sh
@@ -53,6 +53,13 @@ asan tsan: packages
 	cmake --preset $@ -D ZO_BUILD_QT=$(QT) -D ZO_HUB_PROGRAM=$(HUB) >/dev/null
 	cmake --build --preset $@ -j $(JOBS)
 	ctest --preset $@ -j $(JOBS) -LE '$(LEFT_OUT)'
+
+# One parser against input that nobody wrote: make fuzz NAME=xmp SECONDS=1800 (or json, form, layout)
+SECONDS ?= 60
+fuzz: packages
+	cmake --preset fuzz >/dev/null
+	cmake --build --preset fuzz -j $(JOBS) --target fuzz_$(NAME)
+	Tests/Fuzz/run.sh build/fuzz $(NAME) $(SECONDS)
 
 # clang checks the lock annotations; nothing is run.
 analysis: packages
