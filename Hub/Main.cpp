@@ -12,7 +12,7 @@ constexpr char kHelp[] = R"(zohub, a collaboration hub for one machine
               [--token-lifetime SECONDS] [--max-connections N] [--max-body BYTES] [--read-threads N]
               [--header-timeout-ms N] [--body-timeout-ms N] [--faults SCRIPT]
   zohub user add NAME --password-file FILE|--password-stdin [--admin] [--replace]
-              [--first-name TEXT] [--last-name TEXT] [--email TEXT]
+              [--first-name TEXT] [--last-name TEXT] [--email TEXT] [--password-cost 10..16]
   zohub import DIR --production NAME --owner USER [--grant USER]... [--mount LABEL] [--template]
   zohub export DIR --production NAME|ID
   zohub check

@@ -17,7 +17,6 @@ namespace zohub {
 
 namespace {
 
-constexpr std::uint64_t kCost = 1 << 15;
 constexpr std::uint64_t kBlockSize = 8;
 constexpr std::uint64_t kParallel = 1;
 constexpr std::uint64_t kMaxMemory = 128ull << 20;
@@ -46,11 +45,12 @@ std::optional<std::uint64_t> NumberOf(std::string_view inText) {
 
 }  // namespace
 
-std::string HashPassword(std::string_view inPassword) {
+std::string HashPassword(std::string_view inPassword, unsigned inCost) {
     std::string const salt = RandomHex(16);
-    return "scrypt$" + std::to_string(kCost) + "$" + std::to_string(kBlockSize) + "$" +
+    std::uint64_t const cost = std::uint64_t{1} << inCost;
+    return "scrypt$" + std::to_string(cost) + "$" + std::to_string(kBlockSize) + "$" +
            std::to_string(kParallel) + "$" + salt + "$" +
-           Derive(inPassword, salt, kCost, kBlockSize, kParallel);
+           Derive(inPassword, salt, cost, kBlockSize, kParallel);
 }
 
 bool PasswordMatches(std::string_view inPassword, std::string const& inHash) {
@@ -66,7 +66,7 @@ bool PasswordMatches(std::string_view inPassword, std::string const& inHash) {
 }
 
 void SpendPasswordTime(std::string_view inPassword) {
-    Derive(inPassword, "0123456789abcdef0123456789abcdef", kCost, kBlockSize, kParallel);
+    Derive(inPassword, "0123456789abcdef0123456789abcdef", 1 << kUsualPasswordCost, kBlockSize, kParallel);
 }
 
 }  // namespace zohub

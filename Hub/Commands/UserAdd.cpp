@@ -37,6 +37,7 @@ int RunUserAdd(std::vector<std::string> const& inWords) {
     Arguments const arguments(inWords, {{"--data"},
                                         {"--password-file"},
                                         {"--password-stdin", false},
+                                        {"--password-cost"},
                                         {"--first-name"},
                                         {"--last-name"},
                                         {"--email"},
@@ -54,7 +55,11 @@ int RunUserAdd(std::vector<std::string> const& inWords) {
     for (auto const* text : {&user.firstName, &user.lastName, &user.email})
         if (!text->empty() && !IsDisplayName(*text))
             throw UsageError("names and the address must be UTF-8 without control characters");
-    user.passwordHash = HashPassword(ReadPassword(arguments));
+    auto const cost = arguments.Number("--password-cost", kUsualPasswordCost, kLargestPasswordCost);
+    if (cost < kSmallestPasswordCost)
+        throw UsageError("--password-cost takes a number from " + std::to_string(kSmallestPasswordCost) +
+                         " to " + std::to_string(kLargestPasswordCost));
+    user.passwordHash = HashPassword(ReadPassword(arguments), static_cast<unsigned>(cost));
 
     auto const storage = OpenSqliteStorage(arguments.DataDirectory());
     auto const transaction = storage->BeginWrite();
