@@ -18,7 +18,9 @@ std::string TextAfter(const std::string& inText, const std::string& inMark) {
 }
 
 std::vector<std::string> EnvironmentOf(const std::filesystem::path& inHome) {
-    return {"ZOCLIENT_CONFIG_HOME=" + (inHome / "config").string(),
+    // Little memory in front of the payload cache's files, so that growth is not what it keeps by rule.
+    return {"ZOCLIENT_DEBUG_ZOClient_ContentCacheMemoryMegabytes=1",
+            "ZOCLIENT_CONFIG_HOME=" + (inHome / "config").string(),
             "ZOCLIENT_STATE_HOME=" + (inHome / "state").string(),
             "ZOCLIENT_CACHE_HOME=" + (inHome / "cache").string()};
 }
@@ -36,7 +38,9 @@ RunningHub::RunningHub(const Setting& inSetting, const std::filesystem::path& in
         const std::string file = (inDirectory / "password").string();
         std::ofstream(file) << PasswordOf(user) << "\n";
         std::string text;
-        if (RunToEnd({"user", "add", user, "--admin", "--password-file", file}, text) != 0) {
+        // Schedules sign in over and over: with the usual cost the hub would do little else.
+        if (RunToEnd({"user", "add", user, "--admin", "--password-cost", "10", "--password-file", file},
+                     text) != 0) {
             throw std::runtime_error("cannot add a user to the hub: " + text);
         }
     }

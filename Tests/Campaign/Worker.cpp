@@ -2,9 +2,7 @@
 #include "Worker.h"
 
 #include <malloc.h>
-#include <unistd.h>
 
-#include <fstream>
 #include <iostream>
 #include <map>
 #include <nlohmann/json.hpp>
@@ -268,14 +266,12 @@ private:
     }
 
     json Counts(const json&) {
-        malloc_trim(0);
-        unsigned long pages = 0;
-        std::ifstream("/proc/self/statm") >> pages >> pages;
+        const struct mallinfo2 heap = mallinfo2();
         const CallCounts counts = mHost.Counts();
         return {{"started", counts.started},
                 {"ended", counts.ended},
                 {"endedAgain", counts.endedAgain},
-                {"resident", pages * static_cast<unsigned long>(sysconf(_SC_PAGESIZE))},
+                {"allocated", heap.uordblks + heap.hblkhd},
                 {"wasEnded", mHost.WasEnded()}};
     }
 
