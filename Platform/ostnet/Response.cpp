@@ -33,11 +33,25 @@ bool HeaderNameLess::operator()(const ImmutableString& inLeft,
     if (inLeft == inRight) {
         return false;
     }
-    const std::string_view left = inLeft, right = inRight;
-    return std::lexicographical_compare(
-        left.begin(), left.end(), right.begin(), right.end(), [](char inA, char inB) {
-            return LowerASCII(static_cast<unsigned char>(inA)) < LowerASCII(static_cast<unsigned char>(inB));
-        });
+    const std::string_view left = inLeft.view(), right = inRight.view();
+    const std::size_t common = std::min(left.size(), right.size());
+    for (std::size_t i = 0; i < common; ++i) {
+        const int difference = LowerASCII(static_cast<unsigned char>(left[i])) -
+                               LowerASCII(static_cast<unsigned char>(right[i]));
+        if (difference != 0) {
+            return difference < 0;
+        }
+    }
+    return left.size() < right.size();
+}
+
+Headers CopyWithRoom(const Headers& inHeaders, std::size_t inAdded) {
+    Headers::sequence_type fields;
+    fields.reserve(inHeaders.size() + inAdded);
+    fields.assign(inHeaders.begin(), inHeaders.end());
+    Headers copy;
+    copy.adopt_sequence(boost::container::ordered_range, std::move(fields));
+    return copy;
 }
 
 ImmutableString GetHeader(const Headers& inHeaders, const ImmutableString& inName) {

@@ -2,8 +2,9 @@
 #pragma once
 
 #include <cstdint>
-#include <map>
 #include <string>
+
+#include <boost/container/flat_map.hpp>
 
 #include "ostcore/Export.h"
 #include "ostcore/Types.h"
@@ -24,7 +25,10 @@ struct HeaderNameLess {
                                       const ImmutableString& inRight) const noexcept;
 };
 /// Header fields by name; a name can occur more than once. Passed by value between layers.
-using Headers = std::multimap<ImmutableString, ImmutableString, HeaderNameLess>;
+using Headers = boost::container::flat_multimap<ImmutableString, ImmutableString, HeaderNameLess>;
+
+/// A copy to which so many fields can be added without another allocation.
+ZOPLATFORM_EXPORT Headers CopyWithRoom(const Headers& inHeaders, std::size_t inAdded);
 
 /// The first value under a name, the null string when there is none.
 ZOPLATFORM_EXPORT ImmutableString GetHeader(const Headers& inHeaders, const ImmutableString& inName);

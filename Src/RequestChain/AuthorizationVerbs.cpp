@@ -7,6 +7,12 @@ namespace ZOCL {
 
 using Verb = PackedRequest::Verb;
 
+namespace {
+
+constexpr std::size_t kAddedHeaders = 2;
+
+}
+
 void AuthorizationProcessor::AddAuthorizationHeaders(const ImmutableString& inToken, Headers& ioHeaders) {
     if (!inToken.IsNull()) {
         ioHeaders.emplace(ostnet::kHEADER_COOKIE, inToken);
@@ -67,23 +73,25 @@ bool AuthorizationProcessor::SendPacked(const Request& inRequest, const Immutabl
                                         const CompletionFunction& inCompletion) {
     const PackedRequest& packed = inRequest.packed;
     const Guid& requestID = inRequest.requestID;
+    Headers headers = ostnet::CopyWithRoom(packed.headers, kAddedHeaders);
     switch (packed.verb) {
         case Verb::kGet:
-            return SendGET(inToken, requestID, inCompletion, packed.url, packed.headers, packed.options);
+            return SendGET(inToken, requestID, inCompletion, packed.url, std::move(headers), packed.options);
         case Verb::kHead:
-            return SendHEAD(inToken, requestID, inCompletion, packed.url, packed.headers, packed.options);
+            return SendHEAD(inToken, requestID, inCompletion, packed.url, std::move(headers), packed.options);
         case Verb::kPut:
-            return packed.form ? SendPUT(inToken, requestID, inCompletion, packed.url, packed.headers,
+            return packed.form ? SendPUT(inToken, requestID, inCompletion, packed.url, std::move(headers),
                                          *packed.form, packed.options)
-                               : SendPUT(inToken, requestID, inCompletion, packed.url, packed.headers,
+                               : SendPUT(inToken, requestID, inCompletion, packed.url, std::move(headers),
                                          packed.payload, packed.options);
         case Verb::kPost:
-            return packed.form ? SendPOST(inToken, requestID, inCompletion, packed.url, packed.headers,
+            return packed.form ? SendPOST(inToken, requestID, inCompletion, packed.url, std::move(headers),
                                           *packed.form, packed.options)
-                               : SendPOST(inToken, requestID, inCompletion, packed.url, packed.headers,
+                               : SendPOST(inToken, requestID, inCompletion, packed.url, std::move(headers),
                                           packed.payload, packed.options);
         case Verb::kDelete:
-            return SendDELETE(inToken, requestID, inCompletion, packed.url, packed.headers, packed.options);
+            return SendDELETE(inToken, requestID, inCompletion, packed.url, std::move(headers),
+                              packed.options);
     }
     return false;
 }

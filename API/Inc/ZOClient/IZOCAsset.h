@@ -1,6 +1,7 @@
 // The items of a production: clips, sequences, bins, compositions and the like.
 #pragma once
 
+#include <map>
 #include <string>
 #include <vector>
 

@@ -1,6 +1,7 @@
 // The developers' switches.
 #include "ostcore/debug/DebugDatabase.h"
 
+#include <atomic>
 #include <charconv>
 #include <cstdlib>
 
@@ -82,11 +83,15 @@ std::string EnvironmentName(std::string_view inKey) {
 class Database {
 public:
     optional<std::string> Find(std::string_view inKey) ZO_EXCLUDES(mMutex) {
+        if (mHasNothing.load(std::memory_order_acquire)) {
+            return {};
+        }
         MutexLock lock(mMutex);
         if (!mIsRead) {
             mFile = ReadFile();
             mEnvironment = ReadEnvironment();
             mIsRead = true;
+            mHasNothing = mFile.empty() && mEnvironment.empty() && mOverrides.empty();
         }
         if (const auto found = mOverrides.find(inKey); found != mOverrides.end()) {
             return found->second;
@@ -103,6 +108,7 @@ public:
     void SetOverride(std::string_view inKey, std::string_view inValue) ZO_EXCLUDES(mMutex) {
         MutexLock lock(mMutex);
         mOverrides[std::string(inKey)] = std::string(inValue);
+        mHasNothing = false;
     }
 
     void ClearOverrides() ZO_EXCLUDES(mMutex) {
@@ -113,10 +119,13 @@ public:
     void Forget() ZO_EXCLUDES(mMutex) {
         MutexLock lock(mMutex);
         mIsRead = false;
+        mHasNothing = false;
     }
 
 private:
     Mutex mMutex;
+    /// As it is on nearly every machine: requests ask too, and need no lock then.
+    std::atomic<bool> mHasNothing{false};
     bool mIsRead ZO_GUARDED_BY(mMutex) = false;
     Values mFile ZO_GUARDED_BY(mMutex);
     Values mEnvironment ZO_GUARDED_BY(mMutex);

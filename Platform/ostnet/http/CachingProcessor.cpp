@@ -83,7 +83,10 @@ bool CachingProcessor::GET(const Guid& inRequestID, const CompletionFunction& in
         return Next()->GET(inRequestID, inCompletion, inURL, std::move(inHeaders), inOptions);
     }
     const auto delivery = boost::make_shared<Delivery>(Delivery{inCompletion, inRequestID, nullptr});
-    const ImmutableString callerTag = GetHeader(inHeaders, kHEADER_IF_NONE_MATCH);
+    const auto condition = inHeaders.find(kHEADER_IF_NONE_MATCH);
+    const bool isConditional = condition != inHeaders.end();
+    const ImmutableString callerTag = isConditional ? condition->second : ImmutableString();
+    ImmutableString heldTag;
     FetchRef fetch;
     {
         ScopedLock lock(mMutex, "CachingProcessor::GET");
@@ -99,11 +102,14 @@ bool CachingProcessor::GET(const Guid& inRequestID, const CompletionFunction& in
         FetchRef& present = mFetchByURL[inURL];
         const bool joins = present && present->generation == mGeneration;
         if (!joins) {
-            inHeaders.erase(kHEADER_IF_NONE_MATCH);
+            if (isConditional) {
+                inHeaders.erase(kHEADER_IF_NONE_MATCH);
+            }
             present = boost::make_shared<Fetch>(shared_from_this(), inURL, std::move(inHeaders), inOptions);
             present->responses = mResponses;
             present->generation = mGeneration;
-            if (record && !GetHeader(record->response->headers, kHEADER_ETAG).empty()) {
+            heldTag = record ? GetHeader(record->response->headers, kHEADER_ETAG) : ImmutableString();
+            if (!heldTag.empty()) {
                 present->held = record->response;
             }
         }
@@ -114,9 +120,9 @@ bool CachingProcessor::GET(const Guid& inRequestID, const CompletionFunction& in
         }
         fetch = present;
     }
-    Headers headers = fetch->headers;
-    if (fetch->held) {
-        headers.emplace(kHEADER_IF_NONE_MATCH, GetHeader(fetch->held->headers, kHEADER_ETAG));
+    Headers headers = CopyWithRoom(fetch->headers, 1);
+    if (!heldTag.empty()) {
+        headers.emplace(kHEADER_IF_NONE_MATCH, heldTag);
     }
     return Send(fetch, fetch->networkID, std::move(headers)) || OnStartFailed(fetch, inRequestID);
 }

@@ -11,6 +11,8 @@ using ostcore::utility::EqualsIgnoreCaseASCII;
 
 namespace {
 
+constexpr std::size_t kUsualFields = 12;
+
 bool IsTokenCharacter(char inCharacter) noexcept {
     const char lower = static_cast<char>(inCharacter | 0x20);
     if ((lower >= 'a' && lower <= 'z') || (inCharacter >= '0' && inCharacter <= '9')) {
@@ -59,6 +61,7 @@ std::optional<std::uint64_t> ParseContentLength(std::string_view inText) noexcep
 
 Headers ParseHead(std::string_view inHead) {
     Headers headers;
+    headers.reserve(kUsualFields);
     std::string_view name;
     std::string value;
     while (!inHead.empty()) {
