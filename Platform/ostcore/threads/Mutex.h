@@ -5,6 +5,7 @@
 #include <condition_variable>
 #include <mutex>
 
+#include "ostcore/threads/SpinBeforeSleep.h"
 #include "ostcore/threads/ThreadAnnotations.h"
 
 namespace ostcore {
@@ -17,7 +18,7 @@ public:
     Mutex(const Mutex&) = delete;
     Mutex& operator=(const Mutex&) = delete;
 
-    void Lock() const ZO_ACQUIRE() { mMutex.lock(); }
+    void Lock() const ZO_ACQUIRE() { detail::LockOrSleep(mMutex); }
     void Unlock() const ZO_RELEASE() { mMutex.unlock(); }
 
 private:
@@ -28,7 +29,9 @@ private:
 /// Holds a Mutex for a scope; Unlock lets go early.
 class ZO_SCOPED_CAPABILITY MutexLock {
 public:
-    explicit MutexLock(const Mutex& inMutex) ZO_ACQUIRE(inMutex) : mLock(inMutex.mMutex) {}
+    explicit MutexLock(const Mutex& inMutex) ZO_ACQUIRE(inMutex) : mLock(inMutex.mMutex, std::defer_lock) {
+        detail::LockOrSleep(mLock);
+    }
     ~MutexLock() ZO_RELEASE() {}
     MutexLock(const MutexLock&) = delete;
     MutexLock& operator=(const MutexLock&) = delete;

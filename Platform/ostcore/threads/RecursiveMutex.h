@@ -5,6 +5,7 @@
 #include <mutex>
 
 #include "ostcore/Export.h"
+#include "ostcore/threads/SpinBeforeSleep.h"
 #include "ostcore/threads/ThreadAnnotations.h"
 
 namespace ostcore {
@@ -20,7 +21,7 @@ public:
 
     /// inLabel must outlive the lock: a literal with the qualified operation name.
     void Lock(const char* inLabel) const ZO_ACQUIRE() {
-        mMutex.lock();
+        detail::LockOrSleep(mMutex);
         mHolder.store(inLabel, std::memory_order_relaxed);
     }
     bool TryLock(const char* inLabel) const ZO_TRY_ACQUIRE(true) {
