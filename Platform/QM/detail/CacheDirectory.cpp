@@ -18,7 +18,9 @@ namespace {
 constexpr int kShards = 256;
 /// Not blocking, so that a pipe in the place of a file does not hold us up before it is refused.
 constexpr int kReadFlags = O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC;
-constexpr std::int64_t kTouchAfterSeconds = 60;
+// The time of access is nobody's concern here, and to note it costs the file system as much as the read. Of a
+// file of somebody else the system refuses it; then the longer way is taken.
+constexpr int kQuickReadFlags = kReadFlags | O_NOATIME;
 constexpr std::int64_t kSweepAfterSeconds = 3600;
 constexpr std::string_view kAsidePrefix = ".new-";
 
@@ -64,21 +66,22 @@ int Advance(iovec*& ioParts, int inCount, std::size_t inBytes) {
     return inCount;
 }
 
-/// Calls until all parts are through; false on failure and when nothing moves any more.
+/// Calls until no more than so many parts are left, and returns how many are. More are left after a failure,
+/// and when nothing moves any more.
 template <class Call>
-bool Transfer(const Call& inCall, iovec* inParts, int inCount) {
+int Transfer(const Call& inCall, iovec* inParts, int inCount, int inEnough = 0) {
     inCount = Advance(inParts, inCount, 0);
-    while (inCount > 0) {
+    while (inCount > inEnough) {
         const ssize_t moved = inCall(inParts, inCount);
         if (moved < 0 && errno == EINTR) {
             continue;
         }
         if (moved <= 0) {
-            return false;
+            break;
         }
         inCount = Advance(inParts, inCount, static_cast<std::size_t>(moved));
     }
-    return true;
+    return inCount;
 }
 
 /// There is no such directory, or nothing in it can be used anyway.
@@ -183,28 +186,23 @@ OpenFile CacheDirectory::MakeShard(const std::string& inName) const {
     return OpenShard(inName, O_PATH);
 }
 
+/// False as well when the file goes on behind the payload.
 bool CacheDirectory::ReadWhole(int inFile, Header& outHeader, RecycledMemory& outPayload) const {
-    iovec parts[] = {{outHeader.data(), outHeader.size()}, {outPayload.data(), outPayload.size()}};
+    char more = 0;
+    iovec parts[] = {
+        {outHeader.data(), outHeader.size()}, {outPayload.data(), outPayload.size()}, {&more, 1}};
     errno = 0;
-    return Transfer(
-        [&](const iovec* inParts, int inCount) { return mOperations->ReadV(inFile, inParts, inCount); },
-        parts, 2);
+    return Transfer([&](const iovec* inParts,
+                        int inCount) { return mOperations->ReadV(inFile, inParts, inCount); },
+                    parts, 3, 1) == 1;
 }
 
-CacheDirectory::Outcome CacheDirectory::ReadOpened(int inFile, const EntryKey& inKey,
-                                                   shared_ptr<RecycledMemory>& outPayload) const {
-    struct stat status {};
-    if (mOperations->FStat(inFile, status) != 0) {
-        return Outcome::kFailed;
-    }
-    const auto size = static_cast<std::uint64_t>(std::max<off_t>(status.st_size, 0));
-    if (!IsOwnRegularFile(status) || size < kHeaderSize || size > FileSizeOf(kMaximumPayloadSize)) {
-        return Outcome::kDamaged;
-    }
-    // The size comes from the disk, so there may be too little memory for it.
+/// Of a file of that size. The size can come from the disk, so there may be too little memory for it.
+CacheDirectory::Outcome CacheDirectory::ReadContent(int inFile, const EntryKey& inKey, std::uint64_t inSize,
+                                                    shared_ptr<RecycledMemory>& outPayload) const {
     shared_ptr<RecycledMemory> payload;
     try {
-        payload = RecycledMemory::Create(static_cast<std::size_t>(size - kHeaderSize));
+        payload = RecycledMemory::Create(static_cast<std::size_t>(inSize - kHeaderSize));
     } catch (const std::bad_alloc&) {
         return Outcome::kFailed;
     }
@@ -217,26 +215,45 @@ CacheDirectory::Outcome CacheDirectory::ReadOpened(int inFile, const EntryKey& i
         !IsPayloadOf(header, payload->view())) {
         return Outcome::kDamaged;
     }
-    if (std::abs(std::time(nullptr) - status.st_mtim.tv_sec) > kTouchAfterSeconds) {
-        mOperations->Touch(inFile);
-    }
     outPayload = payload;
     return Outcome::kRead;
 }
 
-CacheDirectory::Outcome CacheDirectory::Read(const EntryKey& inKey,
-                                             shared_ptr<RecycledMemory>& outPayload) const {
-    const std::string path = DirectoryNameOf(inKey) + "/" + FileNameOf(inKey);
-    const OpenFile file(*mOperations, mOperations->OpenBeneath(mRoot, path.c_str(), kReadFlags));
-    if (file.IsOpen()) {
-        const Outcome outcome = ReadOpened(file.Get(), inKey, outPayload);
-        // Damaged: the longer way sees it again and knows where to remove it.
-        return outcome == Outcome::kDamaged ? ReadStepByStep(inKey, outPayload) : outcome;
+CacheDirectory::Outcome CacheDirectory::ReadOpened(int inFile, const EntryKey& inKey, FileState& outState,
+                                                   shared_ptr<RecycledMemory>& outPayload) const {
+    struct stat status {};
+    if (mOperations->FStat(inFile, status) != 0) {
+        return Outcome::kFailed;
     }
-    return errno == ENOENT ? Outcome::kMissing : ReadStepByStep(inKey, outPayload);
+    const auto size = static_cast<std::uint64_t>(std::max<off_t>(status.st_size, 0));
+    if (!IsOwnRegularFile(status) || size < kHeaderSize || size > FileSizeOf(kMaximumPayloadSize)) {
+        return Outcome::kDamaged;
+    }
+    const Outcome outcome = ReadContent(inFile, inKey, size, outPayload);
+    const std::int64_t now = std::time(nullptr);
+    outState = {size, status.st_mtim.tv_sec};
+    if (outcome == Outcome::kRead && std::abs(now - outState.stamp) > kStampSeconds) {
+        mOperations->Touch(inFile);
+        outState.stamp = now;
+    }
+    return outcome;
 }
 
-CacheDirectory::Outcome CacheDirectory::ReadStepByStep(const EntryKey& inKey,
+CacheDirectory::Outcome CacheDirectory::Read(const EntryKey& inKey, FileState& ioState,
+                                             shared_ptr<RecycledMemory>& outPayload) const {
+    const std::string path = DirectoryNameOf(inKey) + "/" + FileNameOf(inKey);
+    const OpenFile file(*mOperations, mOperations->OpenBeneath(mRoot, path.c_str(), kQuickReadFlags));
+    if (!file.IsOpen()) {
+        return errno == ENOENT ? Outcome::kMissing : ReadStepByStep(inKey, ioState, outPayload);
+    }
+    const bool isKnown = ioState.size >= kHeaderSize;
+    const Outcome outcome = isKnown ? ReadContent(file.Get(), inKey, ioState.size, outPayload)
+                                    : ReadOpened(file.Get(), inKey, ioState, outPayload);
+    // Not as known, or damaged: the longer way sees it again and knows where to remove it.
+    return outcome == Outcome::kDamaged ? ReadStepByStep(inKey, ioState, outPayload) : outcome;
+}
+
+CacheDirectory::Outcome CacheDirectory::ReadStepByStep(const EntryKey& inKey, FileState& outState,
                                                        shared_ptr<RecycledMemory>& outPayload) const {
     const std::string name = FileNameOf(inKey);
     const OpenFile shard = OpenShard(DirectoryNameOf(inKey), O_PATH);
@@ -248,7 +265,7 @@ CacheDirectory::Outcome CacheDirectory::ReadStepByStep(const EntryKey& inKey,
     if (!file.IsOpen() && !isLink) {
         return errno == ENOENT ? Outcome::kMissing : Outcome::kFailed;
     }
-    const Outcome outcome = isLink ? Outcome::kDamaged : ReadOpened(file.Get(), inKey, outPayload);
+    const Outcome outcome = isLink ? Outcome::kDamaged : ReadOpened(file.Get(), inKey, outState, outPayload);
     if (outcome == Outcome::kDamaged) {
         mOperations->UnlinkAt(shard.Get(), name.c_str());
     }
@@ -258,9 +275,9 @@ CacheDirectory::Outcome CacheDirectory::ReadStepByStep(const EntryKey& inKey,
 bool CacheDirectory::WriteWhole(int inFile, const EntryKey& inKey, std::string_view inPayload) const {
     Header header = MakeHeader(inKey, inPayload);
     iovec parts[] = {{header.data(), header.size()}, {const_cast<char*>(inPayload.data()), inPayload.size()}};
-    return Transfer(
-        [&](const iovec* inParts, int inCount) { return mOperations->WriteV(inFile, inParts, inCount); },
-        parts, 2);
+    return Transfer([&](const iovec* inParts,
+                        int inCount) { return mOperations->WriteV(inFile, inParts, inCount); },
+                    parts, 2) == 0;
 }
 
 bool CacheDirectory::Write(const EntryKey& inKey, std::string_view inPayload) const {

@@ -39,6 +39,7 @@ public:
     };
 
     static constexpr std::uint64_t kMaximumPayloadSize = 512ull << 20;
+    static constexpr std::int64_t kStampSeconds = 60;
 
     /// Null with the reason when the directory cannot be used.
     static shared_ptr<CacheDirectory> Open(const std::string& inPath, bool inCreate,
@@ -50,8 +51,9 @@ public:
     CacheDirectory& operator=(const CacheDirectory&) = delete;
 
     /// The time of the file's last change, by which processes tell what was used last, follows the reads from
-    /// afar: it is set when it is more than a minute old.
-    Outcome Read(const EntryKey& inKey, shared_ptr<RecycledMemory>& outPayload) const;
+    /// afar: it is set when it is more than kStampSeconds old. Who knows that it is not gives the size of the
+    /// file alone, and spares the system the question. With size 0 both are told.
+    Outcome Read(const EntryKey& inKey, FileState& ioState, shared_ptr<RecycledMemory>& outPayload) const;
     bool Write(const EntryKey& inKey, std::string_view inPayload) const;
     bool Exists(const EntryKey& inKey) const;
     /// The stored names of a key, whose name does not count.
@@ -69,8 +71,12 @@ public:
 private:
     OpenFile OpenShard(const std::string& inName, int inFlags) const;
     OpenFile MakeShard(const std::string& inName) const;
-    Outcome ReadStepByStep(const EntryKey& inKey, shared_ptr<RecycledMemory>& outPayload) const;
-    Outcome ReadOpened(int inFile, const EntryKey& inKey, shared_ptr<RecycledMemory>& outPayload) const;
+    Outcome ReadStepByStep(const EntryKey& inKey, FileState& outState,
+                           shared_ptr<RecycledMemory>& outPayload) const;
+    Outcome ReadContent(int inFile, const EntryKey& inKey, std::uint64_t inSize,
+                        shared_ptr<RecycledMemory>& outPayload) const;
+    Outcome ReadOpened(int inFile, const EntryKey& inKey, FileState& outState,
+                       shared_ptr<RecycledMemory>& outPayload) const;
     bool WriteWhole(int inFile, const EntryKey& inKey, std::string_view inPayload) const;
     bool ReadWhole(int inFile, Header& outHeader, RecycledMemory& outPayload) const;
     bool ListShard(const std::string& inName, std::vector<Found>& outFound) const;

@@ -34,6 +34,13 @@ struct EntryKeyHash {
     }
 };
 
+/// What is known of a stored file: its size, and the time of its last change in seconds since 1970; 0 for
+/// unknown.
+struct FileState {
+    std::uint64_t size = 0;
+    std::int64_t stamp = 0;
+};
+
 /// False for an empty key and for a name that is none.
 ZOPLATFORM_EXPORT bool MakeEntryKey(std::string_view inKey, std::string_view inName, EntryKey& outKey);
 /// As MakeEntryKey, for any name.

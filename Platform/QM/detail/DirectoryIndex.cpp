@@ -25,17 +25,17 @@ bool DirectoryIndex::Touch(const EntryKey& inKey) {
     return true;
 }
 
-void DirectoryIndex::Insert(const EntryKey& inKey, std::uint64_t inSize) {
+void DirectoryIndex::Insert(const EntryKey& inKey, const FileState& inFile) {
     const auto inserted = mEntries.try_emplace(inKey);
     Entry& entry = inserted.first->second;
     if (inserted.second) {
         entry.key = &inserted.first->first;
     } else {
         Unlink(entry);
-        mBytes -= entry.size;
+        mBytes -= entry.file.size;
     }
-    entry.size = inSize;
-    mBytes += inSize;
+    entry.file = inFile;
+    mBytes += inFile.size;
     LinkNewest(entry);
 }
 
@@ -45,7 +45,7 @@ bool DirectoryIndex::Remove(const EntryKey& inKey) {
         return false;
     }
     Unlink(found->second);
-    mBytes -= found->second.size;
+    mBytes -= found->second.file.size;
     mEntries.erase(found);
     return true;
 }
@@ -55,13 +55,18 @@ bool DirectoryIndex::TakeOldest(EntryKey& outKey, std::uint64_t& outSize) {
         return false;
     }
     outKey = *mOldest->key;
-    outSize = mOldest->size;
+    outSize = mOldest->file.size;
     return Remove(outKey);
 }
 
-std::uint64_t DirectoryIndex::SizeOf(const EntryKey& inKey) const {
+const FileState* DirectoryIndex::Find(const EntryKey& inKey) const {
     const auto found = mEntries.find(inKey);
-    return found == mEntries.end() ? 0 : found->second.size;
+    return found == mEntries.end() ? nullptr : &found->second.file;
+}
+
+std::uint64_t DirectoryIndex::SizeOf(const EntryKey& inKey) const {
+    const FileState* const file = Find(inKey);
+    return file ? file->size : 0;
 }
 
 }  // namespace detail

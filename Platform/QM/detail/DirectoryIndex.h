@@ -22,8 +22,10 @@ public:
     bool Contains(const EntryKey& inKey) const { return mEntries.count(inKey) > 0; }
     /// Marks it as used last; false when it is not known.
     bool Touch(const EntryKey& inKey);
-    /// Adds it, or gives it another size, as used last.
-    void Insert(const EntryKey& inKey, std::uint64_t inSize);
+    /// Null when it is not known. Good until the next change.
+    const FileState* Find(const EntryKey& inKey) const;
+    /// Adds it, or changes what is known of it, as used last.
+    void Insert(const EntryKey& inKey, const FileState& inFile);
     bool Remove(const EntryKey& inKey);
     /// Takes out the one that was not used for longest; false when there is none.
     bool TakeOldest(EntryKey& outKey, std::uint64_t& outSize);
@@ -36,7 +38,7 @@ public:
 
 private:
     struct Entry {
-        std::uint64_t size = 0;
+        FileState file;
         const EntryKey* key = nullptr;
         Entry* older = nullptr;
         Entry* newer = nullptr;

@@ -1,6 +1,8 @@
 #include "QM/detail/FileDataCache.h"
 
 #include <algorithm>
+#include <ctime>
+#include <iterator>
 #include <thread>
 
 #include "ostcore/debug/Trace.h"
@@ -24,7 +26,34 @@ constexpr std::uint64_t kMaximumPendingBytes = 64ull << 20;
 constexpr std::size_t kLookupsBeforeLook = 32;
 constexpr std::size_t kMaximumKnownNames = 16;
 constexpr std::size_t kWritesInATurn = 256;
+constexpr std::size_t kReadsInSight = 8;
 constexpr std::chrono::minutes kLookPeriod{10};
+constexpr std::int64_t kNanoseconds = 1000000000;
+
+/// Who lists the names of a key reads one of them next, on the same thread.
+EntryKey KeyWithoutName(const ImmutableString& inKey) {
+    thread_local ImmutableString lastText;
+    thread_local EntryKey lastKey;
+    if (lastText != inKey) {
+        lastKey = MakeEntryKeyWithoutName(inKey.view());
+        lastText = inKey;
+    }
+    return lastKey;
+}
+
+bool KeyOf(const ImmutableString& inKey, const ImmutableString& inName, EntryKey& outKey) {
+    if (inKey.empty()) {
+        return false;
+    }
+    outKey = KeyWithoutName(inKey);
+    return SetName(outKey, inName.view());
+}
+
+/// The size alone, while the stamp is young enough to need no other.
+FileState KnownStateOf(const FileState& inFile) {
+    const bool isYoung = std::abs(std::time(nullptr) - inFile.stamp) <= CacheDirectory::kStampSeconds;
+    return {isYoung ? inFile.size : 0, 0};
+}
 
 /// More would contend for the processor, fewer would let one slow read hold up all others.
 std::size_t MostReadTurns() {
@@ -74,7 +103,7 @@ std::vector<ImmutableString> FileDataCache::ListNames(const ImmutableString& inK
     if (inKey.empty() || mIsClosed) {
         return found;
     }
-    EntryKey key = MakeEntryKeyWithoutName(inKey);
+    EntryKey key = KeyWithoutName(inKey);
     std::vector<std::string> names, candidates;
     bool areNamesKnown = false;
     bool isLookDue = false;
@@ -112,13 +141,13 @@ std::vector<ImmutableString> FileDataCache::ListNames(const ImmutableString& inK
 
 bool FileDataCache::Contains(const ImmutableString& inKey, const ImmutableString& inName) {
     EntryKey key;
-    return !mIsClosed && MakeEntryKey(inKey, inName, key) && IsStored(key);
+    return !mIsClosed && KeyOf(inKey, inName, key) && IsStored(key);
 }
 
 int FileDataCache::Read(const ImmutableString& inKey, const ImmutableString& inName,
                         const ReadCompletion& inCompletion, Payload& outPayload) {
     EntryKey key;
-    if (mIsClosed || !inCompletion || !MakeEntryKey(inKey, inName, key)) {
+    if (mIsClosed || !inCompletion || !KeyOf(inKey, inName, key)) {
         return kResultFailure;
     }
     std::uint64_t number = 0;
@@ -130,24 +159,25 @@ int FileDataCache::Read(const ImmutableString& inKey, const ImmutableString& inN
             outPayload = pending->second;
             return kResultContentAvailable;
         }
-        isKnown = mIndex->Contains(key);
-        needsTurn = isKnown && QueueRead(key, inCompletion, number);
+        const FileState* const file = mIndex->Find(key);
+        isKnown = file != nullptr;
+        needsTurn = isKnown && QueueRead(key, KnownStateOf(*file), inCompletion, number);
     }
     if (!isKnown) {
         if (!mDirectory->Exists(key)) {
             return kResultFailure;
         }
         MutexLock lock(mMutex);
-        needsTurn = QueueRead(key, inCompletion, number);
+        needsTurn = QueueRead(key, {}, inCompletion, number);
     }
     return !needsTurn || PostReads(number) ? kResultContentPending : kResultFailure;
 }
 
 /// Whether another thread is to take a turn for it.
-bool FileDataCache::QueueRead(const EntryKey& inKey, const ReadCompletion& inCompletion,
-                              std::uint64_t& outNumber) {
+bool FileDataCache::QueueRead(const EntryKey& inKey, const FileState& inState,
+                              const ReadCompletion& inCompletion, std::uint64_t& outNumber) {
     outNumber = ++mLastRead;
-    mReads.push_back({outNumber, inKey, inCompletion});
+    mReads.push_back({outNumber, inKey, inCompletion, inState});
     if (mReadTurns >= MostReadTurns()) {
         return false;
     }
@@ -176,47 +206,55 @@ bool FileDataCache::PostReads(std::uint64_t inNumber) {
     return false;
 }
 
-/// False when none waits; then the turn has ended.
-bool FileDataCache::TakeRead(WaitingRead& outRead) {
+/// Takes the next reads, after it has marked what the last ones have used: all that needs the lock, in one
+/// go. Many at a time only when so many wait that a slow one among them holds up few of all. False when none
+/// waits; then the turn has ended.
+bool FileDataCache::TakeReads(Reads& ioReads) {
     MutexLock lock(mMutex);
-    if (mReads.empty()) {
-        --mReadTurns;
-        return false;
+    for (const WaitingRead& read : ioReads) {
+        mIndex->Touch(read.key);
     }
-    outRead = std::move(mReads.front());
-    mReads.pop_front();
-    return true;
+    ioReads.clear();
+    const std::size_t count =
+        std::min(ioReads.capacity(), (mReads.size() + kReadsInSight - 1) / kReadsInSight);
+    const auto end = mReads.begin() + static_cast<std::ptrdiff_t>(count);
+    std::move(mReads.begin(), end, std::back_inserter(ioReads));
+    mReads.erase(mReads.begin(), end);
+    mReadTurns -= count == 0 ? 1 : 0;
+    return count > 0;
 }
 
 void FileDataCache::RunReads() {
-    for (WaitingRead read; TakeRead(read); read.completion.clear()) {
-        ostcore::threads::CallGuarded([&] { ReadFile(read.key, read.completion); }, "a read of a cache");
+    Reads reads;
+    while (TakeReads(reads)) {
+        for (WaitingRead& read : reads) {
+            ostcore::threads::CallGuarded([&] { ReadFile(read); }, "a read of a cache");
+            read.completion.clear();
+        }
     }
 }
 
-void FileDataCache::ReadFile(const EntryKey& inKey, const ReadCompletion& inCompletion) {
+void FileDataCache::ReadFile(WaitingRead& ioRead) {
     shared_ptr<RecycledMemory> payload;
-    const CacheDirectory::Outcome outcome = mDirectory->Read(inKey, payload);
-    if (outcome == CacheDirectory::Outcome::kRead) {
-        NoteUse(inKey, CacheDirectory::FileSizeOf(payload->size()));
-    } else if (outcome != CacheDirectory::Outcome::kFailed) {
+    const CacheDirectory::Outcome outcome = mDirectory->Read(ioRead.key, ioRead.state, payload);
+    if (outcome == CacheDirectory::Outcome::kRead && ioRead.state.stamp != 0) {
+        NoteState(ioRead.key, ioRead.state);
+    } else if (outcome == CacheDirectory::Outcome::kMissing || outcome == CacheDirectory::Outcome::kDamaged) {
         MutexLock lock(mMutex);
-        mIndex->Remove(inKey);
+        mIndex->Remove(ioRead.key);
     }
     if (outcome == CacheDirectory::Outcome::kDamaged) {
-        ostcore::debug::Trace(Channel(), ostcore::debug::kTraceLevel_Error,
-                              "A file of the cache was damaged and has been dropped: " + FileNameOf(inKey));
+        ostcore::debug::Trace(
+            Channel(), ostcore::debug::kTraceLevel_Error,
+            "A file of the cache was damaged and has been dropped: " + FileNameOf(ioRead.key));
     }
-    inCompletion(payload ? 0 : kResultFailure, payload);
+    ioRead.completion(payload ? 0 : kResultFailure, payload);
 }
 
 /// A file that another process has written counts from its first use on.
-void FileDataCache::NoteUse(const EntryKey& inKey, std::uint64_t inSize) {
+void FileDataCache::NoteState(const EntryKey& inKey, const FileState& inState) {
     MutexLock lock(mMutex);
-    if (mIndex->Touch(inKey)) {
-        return;
-    }
-    mIndex->Insert(inKey, inSize);
+    mIndex->Insert(inKey, inState);
     const bool isTooMuch = mIndex->Count() > mMaximumCount || mIndex->Bytes() > mMaximumBytes;
     lock.Unlock();
     if (isTooMuch) {
@@ -230,7 +268,7 @@ bool FileDataCache::Write(const ImmutableString& inKey, const ImmutableString& i
                           const Payload& inPayload) {
     EntryKey key;
     if (mIsClosed || !inPayload || inPayload->size() > CacheDirectory::kMaximumPayloadSize ||
-        !MakeEntryKey(inKey, inName, key)) {
+        !KeyOf(inKey, inName, key)) {
         return false;
     }
     {
@@ -340,7 +378,7 @@ void FileDataCache::WriteWithinBounds(const EntryKey& inKey, const Payload& inPa
     const std::uint64_t size = CacheDirectory::FileSizeOf(inPayload->size());
     if (MakeRoom(&inKey, size) && mDirectory->Write(inKey, inPayload->view())) {
         MutexLock lock(mMutex);
-        mIndex->Insert(inKey, size);
+        mIndex->Insert(inKey, {size, std::time(nullptr)});
     }
     ++mWritesSinceLook;
     mBytesSinceLook += size;
@@ -365,7 +403,7 @@ bool FileDataCache::MakeRoom(const EntryKey* inFor, std::uint64_t inSize) {
     while (TakeVictim(inFor, inSize, victim, size)) {
         if (!mDirectory->Remove(victim)) {
             MutexLock lock(mMutex);
-            mIndex->Insert(victim, size);
+            mIndex->Insert(victim, {size, 0});
             return false;
         }
     }
@@ -379,7 +417,7 @@ void FileDataCache::PostMakeRoom() {
 
 void FileDataCache::Remove(const ImmutableString& inKey, const ImmutableString& inName) {
     EntryKey key;
-    if (!MakeEntryKey(inKey, inName, key)) {
+    if (!KeyOf(inKey, inName, key)) {
         return;
     }
     {
@@ -421,7 +459,7 @@ bool FileDataCache::LookAtDirectory() {
     index->Reserve(files.size());
     std::set<std::string> names;
     for (const CacheDirectory::Found& file : files) {
-        index->Insert(file.key, file.size);
+        index->Insert(file.key, {file.size, file.lastUse / kNanoseconds});
         if (names.size() < kMaximumKnownNames) {
             names.emplace(file.key.Name());
         }

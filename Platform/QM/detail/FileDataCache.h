@@ -6,6 +6,8 @@
 #include <set>
 #include <unordered_map>
 
+#include <boost/container/static_vector.hpp>
+
 #include "ostcore/threads/Executor.h"
 #include "ostcore/threads/Mutex.h"
 #include "QM/DataCache.h"
@@ -51,16 +53,19 @@ public:
 private:
     using Pending = std::unordered_map<EntryKey, Payload, EntryKeyHash>;
     struct WaitingRead {
-        std::uint64_t number;
+        std::uint64_t number = 0;
         EntryKey key;
         ReadCompletion completion;
+        /// The size when the file bears a stamp of the last minute.
+        FileState state;
     };
+    using Reads = boost::container::static_vector<WaitingRead, 8>;
 
     explicit FileDataCache(shared_ptr<CacheDirectory> inDirectory);
-    bool QueueRead(const EntryKey& inKey, const ReadCompletion& inCompletion, std::uint64_t& outNumber)
-        ZO_REQUIRES(mMutex);
+    bool QueueRead(const EntryKey& inKey, const FileState& inState, const ReadCompletion& inCompletion,
+                   std::uint64_t& outNumber) ZO_REQUIRES(mMutex);
     bool PostReads(std::uint64_t inNumber);
-    bool TakeRead(WaitingRead& outRead);
+    bool TakeReads(Reads& ioReads);
     void RunReads();
     bool PostWrites(const EntryKey& inKey);
     bool TakeKeyToWrite(EntryKey& outKey);
@@ -78,8 +83,8 @@ private:
     void PostLook();
     bool IsStored(const EntryKey& inKey);
     bool IsKnown(const EntryKey& inKey) const ZO_REQUIRES(mMutex);
-    void NoteUse(const EntryKey& inKey, std::uint64_t inSize);
-    void ReadFile(const EntryKey& inKey, const ReadCompletion& inCompletion);
+    void NoteState(const EntryKey& inKey, const FileState& inState);
+    void ReadFile(WaitingRead& ioRead);
 
     const shared_ptr<CacheDirectory> mDirectory;
     const shared_ptr<ostcore::threads::AsyncThreadedExecutor> mReaders;

@@ -164,6 +164,39 @@ TEST_F(FileCache, LetsTheLeastRecentlyUsedGoAlsoAfterARestart) {
     EXPECT_THAT(Files(), SizeIs(5));
 }
 
+/// Counts how often the system is asked about an open file.
+class AskingOperations : public detail::FileOperations {
+public:
+    int FStat(int inFile, struct stat& outStatus) override {
+        ++asked;
+        return FileOperations::FStat(inFile, outStatus);
+    }
+    std::atomic<int> asked{0};
+};
+
+TEST_F(FileCache, TrustsWhatItKnowsOfAFileUntilAnotherProcessChangesIt) {
+    const auto operations = boost::make_shared<AskingOperations>();
+    Open(operations);
+    const auto ours = cache;
+    EXPECT_TRUE(Write(KeyOf(1), Block(100)));
+    const int before = operations->asked;
+    EXPECT_EQ(Read(KeyOf(1))->size(), 100u);
+    EXPECT_EQ(operations->asked, before) << "it was written a moment ago";
+    cache.reset();
+    Open();
+    for (const std::size_t size : {300u, 50u, 0u}) {
+        EXPECT_TRUE(Write(KeyOf(1), Block(size)));
+        const QM::Payload payload = Read(KeyOf(1), ours.get());
+        ASSERT_TRUE(payload);
+        EXPECT_EQ(payload->size(), size);
+        EXPECT_EQ(Read(KeyOf(1), ours.get())->size(), size) << "it is known again";
+    }
+    std::filesystem::remove(FileOf(1));
+    EXPECT_FALSE(Read(KeyOf(1), ours.get()));
+    EXPECT_FALSE(ours->Contains(KeyOf(1), kName));
+    ours->Close(60000);
+}
+
 TEST_F(FileCache, KeepsToItsBytes) {
     Open();
     cache->SetMaxByteCount(10000);
