@@ -235,6 +235,30 @@ void MeasureReading(const char* inName, std::size_t inTextSize, std::size_t inCo
         inName, Median(ours), Median(baseline), inTextSize / 1024, ratio, Verdict(ratio <= 1.25));
 }
 
+std::size_t ReadAll(SqliteBlobs& ioBlobs, const std::vector<ImmutableString>& inKeys) {
+    std::size_t bytes = 0;
+    std::string payload;
+    for (const ImmutableString& key : inKeys) {
+        Check(ioBlobs.Read(key, payload), "no row");
+        bytes += payload.size();
+    }
+    return bytes;
+}
+
+/// The ratio is that of neighbours in time: over all rounds the machine does not keep its pace.
+void PrintPayloads(const char* inName, const std::vector<double>& inOurs,
+                   const std::vector<double>& inBaseline) {
+    std::vector<double> ratios;
+    for (std::size_t i = 0; i < inOurs.size(); ++i) {
+        ratios.push_back(inOurs[i] / inBaseline[i]);
+    }
+    const double ratio = Median(ratios);
+    std::printf(
+        "bench content-cache-%s: ours %.0f payloads/s, baseline %.0f payloads/s (SQLite blobs of 4 KiB, "
+        "WAL, one transaction each), ratio %.2f, target 1: %s\n",
+        inName, Median(inOurs), Median(inBaseline), ratio, Verdict(ratio >= 1));
+}
+
 void MeasureSmallPayloads() {
     constexpr std::size_t kCount = 20000;
     constexpr std::size_t kSize = 4096;
@@ -257,39 +281,27 @@ void MeasureSmallPayloads() {
         }
         cache.cache->WaitForWrites(60000);
         writes.push_back(kCount / Since(begin));
-        std::atomic<std::size_t> bytes{0};
-        begin = Clock::now();
-        Reads(*cache.cache, kUnderWay).All(keys, [&](const Payload& inPayload) {
-            bytes += inPayload->size();
-        });
-        reads.push_back(kCount / Since(begin));
-        Check(bytes == kCount * kSize, "wrong bytes");
-
         SqliteBlobs blobs(directory.File("blobs.sqlite"));
         begin = Clock::now();
         for (std::size_t i = 0; i < kCount; ++i) {
             Check(blobs.Write(keys[i], payloads[i]->view()), "no insert");
         }
         sqliteWrites.push_back(kCount / Since(begin));
-        std::size_t sum = 0;
-        std::string payload;
-        begin = Clock::now();
-        for (std::size_t i = 0; i < kCount; ++i) {
-            Check(blobs.Read(keys[i], payload), "no row");
-            sum += payload.size();
+        for (int pass = 0; pass < kRounds; ++pass) {
+            std::atomic<std::size_t> bytes{0};
+            begin = Clock::now();
+            Reads(*cache.cache, kUnderWay).All(keys, [&](const Payload& inPayload) {
+                bytes += inPayload->size();
+            });
+            reads.push_back(kCount / Since(begin));
+            Check(bytes == kCount * kSize, "wrong bytes");
+            begin = Clock::now();
+            Check(ReadAll(blobs, keys) == kCount * kSize, "wrong bytes");
+            sqliteReads.push_back(kCount / Since(begin));
         }
-        sqliteReads.push_back(kCount / Since(begin));
-        Check(sum == kCount * kSize, "wrong bytes");
     }
-    const auto print = [](const char* inName, double inOurs, double inBaseline) {
-        const double ratio = inOurs / inBaseline;
-        std::printf(
-            "bench content-cache-%s: ours %.0f payloads/s, baseline %.0f payloads/s (SQLite blobs of 4 KiB, "
-            "WAL, one transaction each), ratio %.2f, target 1: %s\n",
-            inName, inOurs, inBaseline, ratio, Verdict(ratio >= 1));
-    };
-    print("writes", Median(writes), Median(sqliteWrites));
-    print("reads", Median(reads), Median(sqliteReads));
+    PrintPayloads("writes", writes, sqliteWrites);
+    PrintPayloads("reads", reads, sqliteReads);
 }
 
 /// Each write into a full directory evicts; the time is that from the call to the end of the write.
