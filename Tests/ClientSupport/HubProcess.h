@@ -57,8 +57,9 @@ public:
 
     void AddUser(const std::string& inName) {
         std::ofstream(mDirectory + "/password") << inName << "s-secret\n";
+        // Hashing is slow on purpose; the tests sign in often.
         const pid_t adding = Spawn({ZO_HUB_PROGRAM, "user", "add", inName, "--data", mDirectory + "/data",
-                                    "--password-file", mDirectory + "/password"},
+                                    "--password-cost", "10", "--password-file", mDirectory + "/password"},
                                    STDERR_FILENO);
         int status = -1;
         waitpid(adding, &status, 0);

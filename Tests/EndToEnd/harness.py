@@ -111,7 +111,7 @@ class Hub:
     def add_user(self, name, password):
         path = self.directory / f"{name}.password"
         path.write_text(password + "\n")
-        self.command("user", "add", name, "--password-file", path)
+        self.command("user", "add", name, "--password-cost", "10", "--password-file", path)
 
     def import_folder(self, folder, production, owner):
         return self.command("import", folder, "--production", production, "--owner", owner)
