@@ -1,9 +1,10 @@
 #!/usr/bin/env python3
 """Runs the tests of the request chain again and again and stops at the first failure.
 
-soak.py BUILD COUNT [PROGRAM...]: so many rounds of all programs below, or of those that are named. The output of
-a run that fails is printed whole. Interrupted, it says how far it came.
+soak.py BUILD COUNT [PROGRAM...]: so many rounds of all programs below, or of those that are named, as many at a
+time as there are processors. The output of a run that fails is printed whole. Interrupted, it says how far it came.
 """
+import concurrent.futures
 import os
 import pathlib
 import signal
@@ -40,6 +41,13 @@ def run(program, tests, home):
     return None if done.returncode == 0 and not ran_none else f"{done.stdout}\nexit code {done.returncode}"
 
 
+def timed_run(build, name):
+    begun = time.monotonic()
+    with tempfile.TemporaryDirectory(prefix="zo-soak-") as home:
+        failure = run(build / "tests" / name, PROGRAMS[name], home)
+    return failure, time.monotonic() - begun
+
+
 def report(runs, started):
     for name, (count, seconds) in runs.items():
         print(f"{name}: {count} runs without a failure, {seconds / max(count, 1):.1f} s each")
@@ -52,17 +60,20 @@ def main() -> int:
     runs = {name: (0, 0.0) for name in names}
     signal.signal(signal.SIGTERM, signal.default_int_handler)
     started = shown = time.monotonic()
+    # As many at a time as there are processors: most of them wait now and then.
+    pool = concurrent.futures.ThreadPoolExecutor(os.cpu_count() or 1)
     try:
         for round_ in range(1, count + 1):
-            for name in names:
-                begun = time.monotonic()
-                with tempfile.TemporaryDirectory(prefix="zo-soak-") as home:
-                    failure = run(build / "tests" / name, PROGRAMS[name], home)
+            failed = False
+            for name, (failure, seconds) in zip(names, pool.map(lambda name: timed_run(build, name), names)):
                 if failure is not None:
                     print(f"{failure}\n{name} failed in round {round_}")
-                    report(runs, started)
-                    return 1
-                runs[name] = (runs[name][0] + 1, runs[name][1] + time.monotonic() - begun)
+                    failed = True
+                    continue
+                runs[name] = (runs[name][0] + 1, runs[name][1] + seconds)
+            if failed:
+                report(runs, started)
+                return 1
             if time.monotonic() - shown > 60:
                 shown = time.monotonic()
                 print(f"round {round_} of {count}", flush=True)
