@@ -9,7 +9,7 @@ export CCACHE_NOHASHDIR := 1
 # By its list of headers, without a run of the preprocessor before each compilation.
 export CCACHE_DEPEND := 1
 
-.PHONY: demo test soak bench compare fuzz packages build release asan tsan analysis format format-check locks tidy clean
+.PHONY: demo test soak campaign bench compare fuzz packages build release asan tsan analysis format format-check locks tidy clean
 
 packages:
 	@Packaging/install-packages.sh
@@ -26,10 +26,23 @@ REPEAT ?= 1
 test: build
 	ctest --preset dev -j $(JOBS) --repeat until-pass:$(REPEAT)
 
+# For long runs, a build of the tests that is optimized.
+define build-soak
+	cmake --preset release -B build/soak -D ZO_BUILD_TESTS=ON -D ZO_BUILD_BENCHMARKS=OFF -D ZO_BUILD_QT=OFF >/dev/null
+	cmake --build build/soak -j $(JOBS) --target zohub $(1)
+endef
+
 # The tests of the request chain again and again, until one fails: make soak COUNT=1000
 COUNT ?= 100
-soak: build
-	@python3 Tools/dev/soak.py build/dev $(COUNT)
+soak: packages
+	$(call build-soak,test_request_chain test_request_chain_hub test_ostnet test_connection test_faults)
+	@python3 Tools/dev/soak.py build/soak $(COUNT)
+
+# Two users at work while the network fails them, in so many ways: make campaign SCHEDULES=20000
+SCHEDULES ?= 500
+campaign: packages
+	$(call build-soak,campaign)
+	build/soak/tests/campaign --schedules $(SCHEDULES) --jobs $$((2 * $(JOBS)))
 
 release: packages
 	cmake --preset release >/dev/null
