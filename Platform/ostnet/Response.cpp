@@ -2,6 +2,8 @@
 
 #include <curl/curl.h>
 
+#include <algorithm>
+
 #include "ostcore/utility/StringConversion.h"
 #include "ostnet/http/detail/HeaderRules.h"
 
