@@ -118,8 +118,10 @@ public:
     }
     void Growth(unsigned long inBytes, std::uint64_t inSchedules) {
         const std::lock_guard<std::mutex> lock(mMutex);
-        mLargestGrowth = std::max(mLargestGrowth, inBytes);
-        mGrowthOver = inSchedules;
+        if (inBytes >= mLargestGrowth) {
+            mLargestGrowth = inBytes;
+            mGrowthOver = inSchedules;
+        }
     }
     int Finish(const Options& inOptions, double inSeconds) const {
         std::printf(
