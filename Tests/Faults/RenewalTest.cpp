@@ -79,8 +79,11 @@ TEST_F(Renewal, ALogoutEndsWhatWaitsForATokenAndIsAskedForNoNewOne) {
     ASSERT_TRUE(server);
     // The sign-in that renews hangs, so that all requests are parked when the session ends.
     std::atomic<int> hanging{0};
+    std::promise<void> firstHangs;
     hub.Interfere(Step::kLogin, [&](Connection& ioConnection, const ReceivedRequest&, const HubAnswer&) {
-        ++hanging;
+        if (++hanging == 1) {
+            firstHangs.set_value();
+        }
         ioConnection.WaitForClose();
         return false;
     });
@@ -91,6 +94,7 @@ TEST_F(Renewal, ALogoutEndsWhatWaitsForATokenAndIsAskedForNoNewOne) {
     }
     // Four to sign in, the fifty, and the sign-in that hangs.
     ASSERT_TRUE(hub.Server().WaitForRequests(4 + 50 + 1));
+    ASSERT_EQ(firstHangs.get_future().wait_for(std::chrono::seconds(60)), std::future_status::ready);
     IZOCDataServer::Terminate(true);
     flight.WaitForAll();
     EXPECT_EQ(flight.Count(401), 50);
