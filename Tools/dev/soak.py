@@ -78,6 +78,8 @@ def main() -> int:
                 shown = time.monotonic()
                 print(f"round {round_} of {count}", flush=True)
     except KeyboardInterrupt:
+        for again in (signal.SIGINT, signal.SIGTERM):
+            signal.signal(again, signal.SIG_IGN)
         print("interrupted")
         report(runs, started)
         return 130
