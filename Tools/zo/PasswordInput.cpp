@@ -10,6 +10,7 @@
 #include <cstring>
 
 #include "Failure.h"
+#include "ostui/TerminalInput.h"
 
 namespace zo {
 namespace {
@@ -73,7 +74,7 @@ std::string ReadLine(int inDescriptor, const std::string& inWhere, const Interru
         }
         char byte = 0;
         const ssize_t count = ::read(inDescriptor, &byte, 1);
-        if (count < 0 && errno == EINTR) {
+        if (count < 0 && (errno == EINTR || errno == EAGAIN)) {
             continue;
         }
         if (count < 0) {
@@ -118,20 +119,23 @@ std::string PasswordFromFile(const std::string& inPath) {
 }
 
 std::string PasswordFromStandardInput(const Interrupt& inInterrupt) {
-    return RefuseEmpty(ReadLine(STDIN_FILENO, "standard input", &inInterrupt), "standard input");
+    const ostui::TerminalInput input(STDIN_FILENO);
+    return RefuseEmpty(ReadLine(input.Descriptor(), "standard input", &inInterrupt), "standard input");
 }
 
 std::string AskOnTerminal(const std::string& inQuestion, const Interrupt& inInterrupt) {
+    const ostui::TerminalInput terminal(STDIN_FILENO);
     Show(inQuestion);
-    return ReadLine(STDIN_FILENO, "the terminal", &inInterrupt);
+    return ReadLine(terminal.Descriptor(), "the terminal", &inInterrupt);
 }
 
 std::string AskPassword(const std::string& inQuestion, const Interrupt& inInterrupt) {
+    const ostui::TerminalInput terminal(STDIN_FILENO);
     const EchoOff echoOff;
     Show(inQuestion);
     std::string password;
     try {
-        password = ReadLine(STDIN_FILENO, "the terminal", &inInterrupt);
+        password = ReadLine(terminal.Descriptor(), "the terminal", &inInterrupt);
     } catch (...) {
         Show("\n");
         throw;

@@ -10,6 +10,7 @@
 
 #include "Failure.h"
 #include "FileWriter.h"
+#include "ostui/TerminalInput.h"
 #include "Payloads.h"
 #include "ZOClient/XMPMerge.h"
 
@@ -21,8 +22,8 @@ constexpr std::size_t kMostBytes = (std::size_t(64) << 20) + 1;
 const char* const kStandardInput = "-";
 
 // Waits until there is something to read; a request to end the program ends the wait.
-void AwaitInput(Context& ioContext) {
-    pollfd waiting[] = {{STDIN_FILENO, POLLIN, 0}, {ioContext.Signals().Descriptor(), POLLIN, 0}};
+void AwaitInput(int inDescriptor, Context& ioContext) {
+    pollfd waiting[] = {{inDescriptor, POLLIN, 0}, {ioContext.Signals().Descriptor(), POLLIN, 0}};
     while (::poll(waiting, 2, -1) < 0 && errno == EINTR) {
     }
     if (ioContext.Signals().IsRequested()) {
@@ -31,12 +32,13 @@ void AwaitInput(Context& ioContext) {
 }
 
 std::string ReadStandardInput(Context& ioContext) {
+    const ostui::TerminalInput input(STDIN_FILENO);
     std::string bytes;
     char block[65536];
     while (bytes.size() < kMostBytes) {
-        AwaitInput(ioContext);
-        const ssize_t got = ::read(STDIN_FILENO, block, sizeof block);
-        if (got < 0 && errno != EINTR) {
+        AwaitInput(input.Descriptor(), ioContext);
+        const ssize_t got = ::read(input.Descriptor(), block, sizeof block);
+        if (got < 0 && errno != EINTR && errno != EAGAIN) {
             throw Failure(ExitCode::Failure,
                           std::string("reading standard input failed: ") + std::strerror(errno));
         }

@@ -22,6 +22,7 @@ constexpr std::size_t kLongestLine = 4096;
 
 Terminal::Terminal(const TerminalSettings& inSettings)
     : mSettings(inSettings),
+      mInput(inSettings.input),
       mIsInteractive(::isatty(inSettings.input) == 1 && ::isatty(inSettings.output) == 1) {}
 
 bool Terminal::IsInterrupted() const {
@@ -99,13 +100,13 @@ Terminal::Line Terminal::ReadLine(const function<bool()>& inIsOver, std::string&
         if (inIsOver() || IsInterrupted()) {
             return Line::kOver;
         }
-        pollfd watched{mSettings.input, POLLIN, 0};
+        pollfd watched{mInput.Descriptor(), POLLIN, 0};
         if (::poll(&watched, 1, 0) <= 0) {
             ostcore::threads::WaitAndPumpMainThread(kTurnMilliseconds);
             continue;
         }
         char byte = 0;
-        const ssize_t count = ::read(mSettings.input, &byte, 1);
+        const ssize_t count = ::read(mInput.Descriptor(), &byte, 1);
         if (count < 0 && (errno == EINTR || errno == EAGAIN)) {
             continue;
         }

@@ -7,6 +7,7 @@
 #include <string>
 
 #include "ostui/TerminalBackEnd.h"
+#include "ostui/TerminalInput.h"
 
 namespace ostui {
 namespace detail {
@@ -57,6 +58,7 @@ private:
     void EraseLine();
 
     const TerminalSettings mSettings;
+    const TerminalInput mInput;
     const bool mIsInteractive;
     /// What stands on the last line, and whether it is a status.
     U8String mLine;
