@@ -58,13 +58,8 @@ double MedianTime(const std::vector<Measure>& inTimes) {
     return bench::MedianOf(inTimes, &Measure::microsecondsPerRequest);
 }
 
-/// The ratio is that of neighbours in time: over all rounds the machine does not keep its pace.
 double MedianRatio(const std::vector<Measure>& inOurs, const std::vector<Measure>& inBaseline) {
-    std::vector<double> ratios;
-    for (std::size_t i = 0; i < inOurs.size(); ++i) {
-        ratios.push_back(inOurs[i].microsecondsPerRequest / inBaseline[i].microsecondsPerRequest);
-    }
-    return bench::Median(ratios);
+    return bench::MedianRatio(inOurs, inBaseline, &Measure::microsecondsPerRequest);
 }
 
 void PrintTime(const char* inName, double inOurs, double inBaseline, const char* inWhat, double inRatio,

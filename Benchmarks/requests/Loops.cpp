@@ -42,6 +42,15 @@ double MedianOf(const std::vector<Measure>& inMeasures, double Measure::*inValue
     return Median(values);
 }
 
+double MedianRatio(const std::vector<Measure>& inOurs, const std::vector<Measure>& inBaseline,
+                   double Measure::*inValue) {
+    std::vector<double> ratios;
+    for (std::size_t i = 0; i < inOurs.size(); ++i) {
+        ratios.push_back(inOurs[i].*inValue / inBaseline[i].*inValue);
+    }
+    return Median(ratios);
+}
+
 ProcessorLoop::ProcessorLoop(boost::shared_ptr<ostnet::http::RequestProcessor> inProcessor,
                              const Workload& inWorkload)
     : mProcessor(std::move(inProcessor)), mBodySize(inWorkload.bodySize) {

@@ -83,6 +83,9 @@ double ProcessorSeconds();
 void Demand(bool inCondition, const char* inWhat);
 double Median(std::vector<double> inValues);
 double MedianOf(const std::vector<Measure>& inMeasures, double Measure::*inValue);
+/// Of each measure and its neighbour in time: over all rounds the machine does not keep its pace.
+double MedianRatio(const std::vector<Measure>& inOurs, const std::vector<Measure>& inBaseline,
+                   double Measure::*inValue);
 
 template <typename Loop>
 Measure TakeTime(Loop& ioLoop) {

@@ -8,7 +8,7 @@
 namespace {
 
 constexpr std::size_t kBodySize = 1024;
-constexpr int kRounds = 7;
+constexpr int kPairs = 31;
 constexpr double kRateTarget = 0.85;
 constexpr double kProcessorTimeTarget = 1.3;
 
@@ -40,7 +40,7 @@ int main() {
     ours.Run();
     bare.Run();
     std::vector<bench::Measure> oursMeasured, bareMeasured;
-    for (int round = 0; round < kRounds; ++round) {
+    for (int round = 0; round < kPairs; ++round) {
         oursMeasured.push_back(bench::TakeTime(ours));
         bareMeasured.push_back(bench::TakeTime(bare));
     }
@@ -48,7 +48,10 @@ int main() {
     const double bareRate = bench::MedianOf(bareMeasured, &bench::Measure::requestsPerSecond);
     const double ourTime = bench::MedianOf(oursMeasured, &bench::Measure::microsecondsPerRequest);
     const double bareTime = bench::MedianOf(bareMeasured, &bench::Measure::microsecondsPerRequest);
-    const double rateRatio = ourRate / bareRate, timeRatio = ourTime / bareTime;
+    const double rateRatio =
+        bench::MedianRatio(oursMeasured, bareMeasured, &bench::Measure::requestsPerSecond);
+    const double timeRatio =
+        bench::MedianRatio(oursMeasured, bareMeasured, &bench::Measure::microsecondsPerRequest);
     std::printf(
         "bench requests: ours %.0f requests/s, baseline %.0f requests/s (bare libcurl multi loop), "
         "ratio %.2f, target %.2f: %s\n",
