@@ -9,8 +9,8 @@ namespace ostui {
 /// so between the poll() that has seen a line and the read() that would take it. The terminal is opened anew
 /// for this, as the descriptor that the process was given shares its flags with other programs.
 ///
-/// What is no terminal, or has no name to open it by, is read by the descriptor that was given, which stays
-/// open and must outlive this one. Any thread may read; EAGAIN means that there is nothing after all.
+/// What is no terminal, or cannot be opened by its name, is read by the descriptor that was given, which
+/// stays open and must outlive this one. Any thread may read; EAGAIN means that there is nothing after all.
 class ZOPLATFORM_EXPORT TerminalInput {
 public:
     explicit TerminalInput(int inDescriptor);
